@@ -1,0 +1,62 @@
+// SPDX-License-Identifier: MIT
+#include "framework/command_base.h"
+
+#include <utility>
+
+CommandBase::CommandBase(std::string name, std::weak_ptr<CommandBase> parent)
+    : parent(std::move(parent)), name(std::move(name)) {}
+
+void CommandBase::init() {
+  // The parent stays locked until registration is over, so children created
+  // there find its path complete.
+  auto lockedParent = parent.lock();
+  if (lockedParent) hierarchy = lockedParent->hierarchy;
+  hierarchy += "/";
+  hierarchy += name;
+  registerCommands();
+}
+
+bool CommandBase::isAllowed(std::string) { return true; }
+
+void CommandBase::addCommandHandler(std::string name, CommandHandler handler, std::string help) {
+  if (!handler) return;
+  handlers.insert_or_assign(name, std::move(handler));
+  if (!help.empty()) helpTexts.insert_or_assign(std::move(name), std::move(help));
+}
+
+void CommandBase::addSubCommand(std::string name, std::shared_ptr<CommandBase> command) {
+  if (command) subCommands.insert_or_assign(std::move(name), std::move(command));
+}
+
+void CommandBase::addUnlistedSubCommand(std::string name, std::shared_ptr<CommandBase> command) {
+  if (command) unlistedSubCommands.insert_or_assign(std::move(name), std::move(command));
+}
+
+std::shared_ptr<CommandBase> CommandBase::getSubCommandObj(std::string name) {
+  if (auto found = subCommands.find(name); found != subCommands.end()) return found->second;
+  if (auto found = unlistedSubCommands.find(name); found != unlistedSubCommands.end())
+    return found->second;
+  return nullptr;
+}
+
+bool CommandBase::isValidSubCommand(std::string name) {
+  return subCommands.contains(name) || unlistedSubCommands.contains(name);
+}
+
+bool CommandBase::isValidCommand(std::string name) { return handlers.contains(name); }
+
+std::string CommandBase::getHierarchy() { return hierarchy; }
+
+std::weak_ptr<CommandBase> CommandBase::getParent() { return parent; }
+
+bool CommandBase::execCommand(std::string name, std::list<std::string> args) {
+  auto found = handlers.find(name);
+  if (found == handlers.end()) return false;
+  dispatch::group group;
+  // The handler is copied so that it lives through the call even if it
+  // re-registers itself.
+  CommandHandler handler = found->second;
+  bool result = handler(group, std::move(args));
+  group.wait();
+  return result;
+}
