@@ -33,6 +33,8 @@ object object::array(std::vector<object> items) {
 object object::dictionary(std::vector<entry> entries) {
   auto n = std::make_shared<node>();
   auto& d = n->value.emplace<node::dictionary_value>();
+  // Reserved up front so that the vector never moves: the index holds views
+  // of the keys stored in it.
   d.entries.reserve(entries.size());
   for (auto& [key, value] : entries) {
     auto found = d.index.find(key);
@@ -41,9 +43,8 @@ object object::dictionary(std::vector<entry> entries) {
       continue;
     }
     d.entries.emplace_back(std::move(key), std::move(value));
+    d.index.emplace(d.entries.back().first, d.entries.size() - 1);
   }
-  // Index only once the vector no longer moves: the keys are views into it.
-  for (std::size_t i = 0; i < d.entries.size(); ++i) d.index.emplace(d.entries[i].first, i);
   return object(std::move(n));
 }
 

@@ -1,0 +1,107 @@
+// SPDX-License-Identifier: MIT
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <chrono>
+#include <mutex>
+#include <thread>
+#include <vector>
+
+#include "platform/dispatch.h"
+
+namespace {
+
+using namespace std::chrono_literals;
+
+TEST(DispatchQueue, RunsWorkInOrderOnOneThreadAndKeepsItsLabel) {
+  dispatch::queue q("vorntool.queue");
+  EXPECT_EQ(q.label(), "vorntool.queue");
+  EXPECT_FALSE(q.isCurrent());
+  std::vector<int> order;
+  std::vector<std::thread::id> threads;
+  dispatch::group done;
+  for (int i = 0; i < 100; ++i) {
+    done.enter();
+    q.async([&, i] {
+      order.push_back(i);  // serial: no lock needed
+      threads.push_back(std::this_thread::get_id());
+      EXPECT_TRUE(q.isCurrent());
+      done.leave();
+    });
+  }
+  ASSERT_TRUE(done.wait(10s));
+  ASSERT_EQ(order.size(), 100u);
+  for (int i = 0; i < 100; ++i) EXPECT_EQ(order[i], i);
+  for (auto& id : threads) EXPECT_EQ(id, threads.front());
+  EXPECT_NE(threads.front(), std::this_thread::get_id());
+}
+
+TEST(DispatchQueue, PendingWorkFinishesWhenTheLastHandleGoes) {
+  std::atomic<int> ran{0};
+  {
+    dispatch::queue q("short.lived");
+    for (int i = 0; i < 10; ++i) q.async([&] { std::this_thread::sleep_for(1ms); ++ran; });
+  }
+  EXPECT_EQ(ran.load(), 10);
+}
+
+TEST(DispatchQueue, LastHandleMayBeDroppedOnItsOwnThread) {
+  dispatch::group done;
+  done.enter();
+  {
+    dispatch::queue q("self.release");
+    q.async([q, done]() mutable {
+      q = dispatch::queue();  // the work holds the last handle after the outer scope ends
+      done.leave();
+    });
+  }
+  EXPECT_TRUE(done.wait(10s));
+}
+
+TEST(DispatchGroup, WaitEndsWhenEmptyOrAtTheDeadline) {
+  dispatch::group g;
+  EXPECT_TRUE(g.wait(0ns));
+  g.enter();
+  EXPECT_FALSE(g.wait(20ms));
+  std::thread t([g] { g.leave(); });
+  g.wait();
+  t.join();
+  EXPECT_TRUE(g.wait(0ns));
+  g.leave();  // unbalanced: ignored, the group stays empty
+  g.enter();
+  EXPECT_FALSE(g.wait(0ns));
+}
+
+TEST(GroupMembership, EntersPerCopyAndLeavesPerDestruction) {
+  dispatch::group g;
+  {
+    GroupMembership a(g);
+    EXPECT_FALSE(g.wait(0ns));
+    GroupMembership b = a;
+    GroupMembership moved = std::move(a);
+    { GroupMembership c = b; }
+    GroupMembership empty;
+    GroupMembership emptyCopy = empty;
+    b = GroupMembership();
+    EXPECT_FALSE(g.wait(0ns));  // `moved` still holds it
+  }
+  EXPECT_TRUE(g.wait(0ns));
+}
+
+TEST(DispatchBlock, CopyingCopiesCapturedMemberships) {
+  dispatch::group g;
+  dispatch::block<int(int)> empty;
+  EXPECT_FALSE(empty);
+  {
+    dispatch::block<int(int)> b = [m = GroupMembership(g)](int x) { return x + 1; };
+    ASSERT_TRUE(b);
+    EXPECT_EQ(b(1), 2);
+    auto copy = b;
+    b = nullptr;
+    EXPECT_FALSE(g.wait(0ns));  // the copy's own membership
+    EXPECT_EQ(copy(41), 42);
+  }
+  EXPECT_TRUE(g.wait(0ns));
+}
+
+}  // namespace

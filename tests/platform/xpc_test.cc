@@ -1,0 +1,77 @@
+// SPDX-License-Identifier: MIT
+#include <gtest/gtest.h>
+
+#include "platform/xpc.h"
+
+namespace {
+
+TEST(XpcObject, KindsAndTypedViews) {
+  EXPECT_EQ(xpc::object().kind(), xpc::type::null);
+  EXPECT_EQ(*xpc::object::string("s").asString(), "s");
+  EXPECT_EQ(*xpc::object::int64(-5).asInt64(), -5);
+  EXPECT_EQ(*xpc::object::uint64(5).asUint64(), 5u);
+  EXPECT_EQ(*xpc::object::boolean(true).asBool(), true);
+  EXPECT_EQ(*xpc::object::dbl(0.5).asDouble(), 0.5);
+  EXPECT_EQ(xpc::object::array({xpc::object::int64(1)}).asArray()->size(), 1u);
+  // Views of another kind are empty rather than converting.
+  EXPECT_EQ(xpc::object::int64(1).asUint64(), nullptr);
+  EXPECT_EQ(xpc::object::string("1").asInt64(), nullptr);
+  EXPECT_EQ(xpc::object().asString(), nullptr);
+}
+
+TEST(XpcDict, KeepsInsertionOrderAndReplacesInPlace) {
+  xpc::dict d;
+  d.set("b", xpc::object::string("1"));
+  d.set("a", xpc::object::int64(2));
+  d.set("b", xpc::object::boolean(false));
+  const auto& entries = *d.obj().asEntries();
+  ASSERT_EQ(entries.size(), 2u);
+  EXPECT_EQ(entries[0].first, "b");
+  EXPECT_EQ(entries[0].second, xpc::object::boolean(false));
+  EXPECT_EQ(entries[1].first, "a");
+  EXPECT_EQ(d.get("a"), xpc::object::int64(2));
+  EXPECT_TRUE(d.get("missing").isNull());
+}
+
+TEST(XpcDict, BuildingNeverChangesSharedObjects) {
+  xpc::dict d;
+  d.set("k", xpc::object::string("v"));
+  xpc::object snapshot = d;
+  d.set("k", xpc::object::string("w"));
+  EXPECT_EQ(xpc::dyn_cast_or_default(snapshot.get("k"), ""), "v");
+  EXPECT_EQ(xpc::dyn_cast_or_default(d.get("k"), ""), "w");
+}
+
+TEST(XpcDict, NonDictionaryStandsForNull) {
+  for (const auto& o : {xpc::object(), xpc::object::string("x"), xpc::object::array({})}) {
+    xpc::dict d(o);
+    EXPECT_FALSE(d.valid());
+    EXPECT_TRUE(d.get("x").isNull());
+  }
+  EXPECT_TRUE(xpc::dict(xpc::object::dictionary({})).valid());
+}
+
+TEST(XpcDyncast, StringOrFallback) {
+  EXPECT_EQ(xpc::dyn_cast_or_default(xpc::object::string(""), "d"), "");
+  EXPECT_EQ(xpc::dyn_cast_or_default(xpc::object::int64(3), "d"), "d");
+  EXPECT_EQ(xpc::dyn_cast_or_default(xpc::object(), "d"), "d");
+}
+
+TEST(XpcObject, EqualityIsByValue) {
+  auto a = xpc::object::dictionary({{"k", xpc::object::array({xpc::object::uint64(1)})}});
+  auto b = xpc::object::dictionary({{"k", xpc::object::array({xpc::object::uint64(1)})}});
+  auto c = xpc::object::dictionary({{"k", xpc::object::array({xpc::object::int64(1)})}});
+  EXPECT_EQ(a, b);
+  EXPECT_FALSE(a == c);
+  EXPECT_FALSE(xpc::object() == xpc::object::string(""));
+}
+
+TEST(EqualNocase, FoldsAsciiLettersOnly) {
+  EXPECT_TRUE(util::equal_nocase("TAR.GZ", "tar.gz"));
+  EXPECT_TRUE(util::equal_nocase("", ""));
+  EXPECT_FALSE(util::equal_nocase("tar", "tar.gz"));
+  EXPECT_FALSE(util::equal_nocase("\xc3\x89", "\xc3\xa9"));  // É and é stay distinct
+  EXPECT_FALSE(util::equal_nocase("[", "{"));
+}
+
+}  // namespace
