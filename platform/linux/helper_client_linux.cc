@@ -1,0 +1,87 @@
+// SPDX-License-Identifier: MIT
+// vorn::HelperClient over sd-bus.
+#include <condition_variable>
+#include <mutex>
+
+#include "platform/helper_client.h"
+#include "platform/linux/bus_link.h"
+#include "platform/linux/bus_message.h"
+
+namespace vorn {
+namespace {
+
+using namespace std::chrono_literals;
+
+constexpr bus::CallTarget kHelperPerform{"org.vorn.Helper", "/org/vorn/Helper",
+                                         "org.vorn.Helper1", "Perform"};
+
+class BusHelperClient final : public HelperClient {
+ public:
+  explicit BusHelperClient(std::string clientName) : clientName_(std::move(clientName)) {}
+
+  TelephonyXPC::Result perform(helper::TaskID task, const char* command, xpc::dict request,
+                               xpc::dict& response) override {
+    struct Waiter {
+      std::mutex mutex;
+      std::condition_variable cv;
+      bool done = false;
+      TelephonyXPC::Result result;
+      xpc::object response;
+    };
+    auto waiter = std::make_shared<Waiter>();
+    auto args = [client = clientName_, task, cmd = std::string(command ? command : ""),
+                 body = request.obj()](sd_bus_message* m) {
+      return sd_bus_message_append(m, "sus", client.c_str(), std::uint32_t(task), cmd.c_str()) >=
+                 0 &&
+             bus::appendDictionary(m, body);
+    };
+    link_.call(kHelperPerform, std::move(args), bus::callTimeout(15min),
+               [waiter](const bus::CallOutcome& outcome) {
+                 TelephonyXPC::Result result{outcome.status, outcome.description};
+                 xpc::object answer;
+                 if (outcome.status == 0 &&
+                     !bus::readResultReply(outcome.message, result.status, result.description,
+                                           answer))
+                   result = {status::kMalformedReply, "reply has an unexpected signature"};
+                 std::lock_guard lock(waiter->mutex);
+                 waiter->result = std::move(result);
+                 waiter->response = std::move(answer);
+                 waiter->done = true;
+                 waiter->cv.notify_all();
+               });
+    std::unique_lock lock(waiter->mutex);
+    waiter->cv.wait(lock, [&] { return waiter->done; });
+    response = xpc::dict(waiter->response);
+    return waiter->result;
+  }
+
+ private:
+  std::string clientName_;
+  bus::BusLink link_;
+};
+
+std::mutex factoryMutex;
+HelperClient::Factory& installedFactory() {
+  static HelperClient::Factory factory;
+  return factory;
+}
+
+}  // namespace
+
+std::shared_ptr<HelperClient> HelperClient::create(const char* clientName,
+                                                   std::shared_ptr<rilx::LogServer>) {
+  Factory factory;
+  {
+    std::lock_guard lock(factoryMutex);
+    factory = installedFactory();
+  }
+  if (factory) return factory(clientName);
+  return std::make_shared<BusHelperClient>(clientName ? clientName : "");
+}
+
+void HelperClient::setFactory(Factory factory) {
+  std::lock_guard lock(factoryMutex);
+  installedFactory() = std::move(factory);
+}
+
+}  // namespace vorn

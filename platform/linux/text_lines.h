@@ -1,0 +1,19 @@
+// SPDX-License-Identifier: MIT
+#pragma once
+
+#include <functional>
+#include <string>
+#include <string_view>
+
+namespace vorn::bus {
+
+/// Calls `setting` for each `key=value` line of `text`: '#' starts a comment,
+/// blanks around keys and values are dropped, and lines without '=' or with
+/// an empty key are skipped.
+void forEachSetting(std::string_view text,
+                    const std::function<void(std::string_view key, std::string_view value)>& setting);
+
+/// The whole content of a small file; empty when it cannot be read.
+std::string readSmallFile(const std::string& path, std::size_t limit = 1 << 20);
+
+}  // namespace vorn::bus

@@ -1,0 +1,253 @@
+// SPDX-License-Identifier: MIT
+// vorn::client over sd-bus: one Manager, one connection, one I/O thread;
+// events and asynchronous completions are handed to the Manager's queue.
+#include <condition_variable>
+#include <cstdlib>
+#include <map>
+#include <mutex>
+
+#include "platform/linux/bus_link.h"
+#include "platform/linux/bus_message.h"
+#include "platform/linux/text_lines.h"
+#include "platform/linux/trace_properties.h"
+#include "platform/vorn_client.h"
+
+namespace vorn::client {
+namespace {
+
+using namespace std::chrono_literals;
+using Done = std::function<void(TelephonyXPC::Result, xpc::object)>;
+
+constexpr const char* kManagerName = "org.vorn.Manager";
+constexpr bus::CallTarget kPerform{kManagerName, "/org/vorn/Manager", "org.vorn.Manager1",
+                                   "PerformCommand"};
+constexpr bus::CallTarget kHello{kManagerName, "/org/vorn/Manager", "org.vorn.Manager1",
+                                 "Hello"};
+
+std::chrono::microseconds timeoutFor(const std::string& command) {
+  // A collection can take minutes; everything else answers at once.
+  if (command == kCommandTraceDumpState) return bus::callTimeout(15min);
+  return bus::callTimeout(25s);
+}
+
+/// What the I/O thread and the queue share to deliver events: the handlers
+/// and whether delivery is on.
+struct Events : std::enable_shared_from_this<Events> {
+  dispatch::queue queue;
+  std::mutex mutex;
+  std::map<std::string, EventHandler> handlers;
+  bool on = false;
+
+  /// Hands the event to its handler on the queue; called on the I/O thread.
+  void deliver(const std::string& name, xpc::object payload) {
+    EventHandler handler;
+    {
+      std::lock_guard lock(mutex);
+      auto found = handlers.find(name);
+      if (!on || found == handlers.end()) return;
+      handler = found->second;
+    }
+    queue.async([self = shared_from_this(), handler = std::move(handler),
+                 payload = std::move(payload)] {
+      {
+        // Events switched off while this one waited on the queue stay undelivered.
+        std::lock_guard lock(self->mutex);
+        if (!self->on) return;
+      }
+      handler(payload, dispatch::group());
+    });
+  }
+
+  static int onSignal(sd_bus_message* m, void* userdata, sd_bus_error*) {
+    if (sd_bus_message_has_signature(m, "sa{sv}") <= 0) return 0;
+    const char* name = nullptr;
+    xpc::object payload;
+    if (sd_bus_message_read_basic(m, 's', &name) < 0 || !bus::readDictionary(m, payload)) return 0;
+    static_cast<Events*>(userdata)->deliver(name, std::move(payload));
+    return 0;
+  }
+};
+
+/// The answer to GetTraceProperty while the server is down, from the file the
+/// server keeps.
+void answerFromTraceProperties(const std::string& root, const xpc::object& request,
+                               const Done& done) {
+  auto value = bus::findTraceProperty(
+      bus::readSmallFile(bus::tracePropertiesPath(root)),
+      xpc::dyn_cast_or_default(request.get(kKeyTraceName), ""),
+      xpc::dyn_cast_or_default(request.get(kKeyTracePropertyName), ""));
+  if (!value) {
+    done({kResultServerNotRunning, "server is not running"}, {});
+    return;
+  }
+  done({0, ""}, xpc::object::dictionary({{kKeyTracePropertyValue, xpc::object::string(*value)}}));
+}
+
+class BusManager final : public Manager {
+ public:
+  BusManager(std::string clientName, dispatch::queue queue)
+      : clientName_(std::move(clientName)), events_(std::make_shared<Events>()) {
+    events_->queue = std::move(queue);
+    const char* root = std::getenv("VORN_ROOT");
+    root_ = root && *root ? root : "/";
+    Events* events = events_.get();
+    // The match goes out on every new connection before any call, so the
+    // server cannot send an event between Hello's answer and the match.
+    link_ = std::make_unique<bus::BusLink>([events](sd_bus* bus) {
+      sd_bus_match_signal_async(bus, nullptr, kManagerName, "/org/vorn/Manager",
+                                "org.vorn.Manager1", "Event", &Events::onSignal,
+                                /* install_callback= */ nullptr, events);
+    });
+  }
+
+  void registerEventHandler(const std::string& eventName, EventHandler handler) override {
+    std::lock_guard lock(events_->mutex);
+    events_->handlers[eventName] = std::move(handler);
+  }
+
+  void eventsOff() override {
+    std::lock_guard lock(events_->mutex);
+    events_->on = false;
+  }
+
+  void eventsOn() override {
+    {
+      std::lock_guard lock(events_->mutex);
+      events_->on = true;
+    }
+    std::string client = clientName_;
+    Events* events = events_.get();
+    link_->call(
+        kHello,
+        [client](sd_bus_message* m) { return sd_bus_message_append(m, "s", client.c_str()) >= 0; },
+        bus::callTimeout(25s), [events](const bus::CallOutcome& outcome) {
+          xpc::object state;
+          if (outcome.status != 0 || sd_bus_message_has_signature(outcome.message, "a{sv}") <= 0 ||
+              !bus::readDictionary(outcome.message, state))
+            return;
+          events->deliver(kEventServerStateChange, std::move(state));
+        });
+  }
+
+  TelephonyXPC::Result performCommand(const std::string& command, const xpc::object& request,
+                                      xpc::object& response) override {
+    struct Waiter {
+      std::mutex mutex;
+      std::condition_variable cv;
+      bool done = false;
+      TelephonyXPC::Result result;
+      xpc::object response;
+    };
+    auto waiter = std::make_shared<Waiter>();
+    submit(command, request, [waiter](TelephonyXPC::Result result, xpc::object answer) {
+      std::lock_guard lock(waiter->mutex);
+      waiter->result = std::move(result);
+      waiter->response = std::move(answer);
+      waiter->done = true;
+      waiter->cv.notify_all();
+    });
+    // The bus's own call timeout bounds this wait: the handler always runs.
+    std::unique_lock lock(waiter->mutex);
+    waiter->cv.wait(lock, [&] { return waiter->done; });
+    response = waiter->response;
+    return waiter->result;
+  }
+
+  void performCommand(const std::string& command, Completion completion,
+                      const xpc::object& request) override {
+    dispatch::queue queue = events_->queue;
+    submit(command, request,
+           [queue, completion = std::move(completion)](TelephonyXPC::Result result,
+                                                       xpc::object response) mutable {
+             auto run = [completion = std::move(completion), result = std::move(result),
+                         response = std::move(response)] {
+               if (completion) completion(result, response);
+             };
+             if (queue)
+               queue.async(std::move(run));
+             else
+               run();
+           });
+  }
+
+ private:
+  void submit(const std::string& command, const xpc::object& request, Done done) {
+    std::string client = clientName_;
+    auto args = [client, command, request](sd_bus_message* m) {
+      return sd_bus_message_append(m, "ss", client.c_str(), command.c_str()) >= 0 &&
+             bus::appendDictionary(m, request);
+    };
+    auto handle = [done = std::move(done), command, request,
+                   root = root_](const bus::CallOutcome& outcome) {
+      if (outcome.status == kResultServerNotRunning && command == kCommandGetTraceProperty)
+        return answerFromTraceProperties(root, request, done);
+      if (outcome.status != 0) return done({outcome.status, outcome.description}, {});
+      TelephonyXPC::Result result;
+      xpc::object response;
+      if (!bus::readResultReply(outcome.message, result.status, result.description, response))
+        return done({status::kMalformedReply, "reply has an unexpected signature"}, {});
+      done(std::move(result), std::move(response));
+    };
+    link_->call(kPerform, std::move(args), timeoutFor(command), std::move(handle));
+  }
+
+  std::string clientName_;
+  std::string root_;
+  std::shared_ptr<Events> events_;
+  // Last, so it goes first: its shutdown fails pending calls while the
+  // events and the queue are still there.
+  std::unique_ptr<bus::BusLink> link_;
+};
+
+std::mutex factoryMutex;
+ManagerFactory& installedFactory() {
+  static ManagerFactory factory;
+  return factory;
+}
+
+}  // namespace
+
+void SetManagerFactory(ManagerFactory factory) {
+  std::lock_guard lock(factoryMutex);
+  installedFactory() = std::move(factory);
+}
+
+std::shared_ptr<Manager> CreateManager(const std::string& clientName, dispatch::queue queue) {
+  ManagerFactory factory;
+  {
+    std::lock_guard lock(factoryMutex);
+    factory = installedFactory();
+  }
+  if (factory) return factory(clientName, std::move(queue));
+  return std::make_shared<BusManager>(clientName, std::move(queue));
+}
+
+void RegisterEventHandler(std::shared_ptr<Manager> manager, const std::string& eventName,
+                          EventHandler handler) {
+  if (manager) manager->registerEventHandler(eventName, std::move(handler));
+}
+
+void EventsOff(std::shared_ptr<Manager> manager) {
+  if (manager) manager->eventsOff();
+}
+
+void EventsOn(std::shared_ptr<Manager> manager) {
+  if (manager) manager->eventsOn();
+}
+
+TelephonyXPC::Result PerformCommand(std::shared_ptr<Manager> manager, const std::string& command,
+                                    xpc::object request, xpc::object& response) {
+  if (!manager) {
+    response = {};
+    return {kResultServerNotRunning, "no manager"};
+  }
+  return manager->performCommand(command, request, response);
+}
+
+void PerformCommand(std::shared_ptr<Manager> manager, const std::string& command,
+                    Completion completion, xpc::object request) {
+  if (manager) return manager->performCommand(command, std::move(completion), request);
+  if (completion) completion({kResultServerNotRunning, "no manager"}, {});
+}
+
+}  // namespace vorn::client
