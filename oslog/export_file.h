@@ -1,0 +1,36 @@
+// SPDX-License-Identifier: MIT
+#pragma once
+
+#include <string>
+
+namespace oslog {
+
+/// The export's output file. Lines are built straight into its buffer and
+/// written in blocks as they arrive, so one write call serves many lines;
+/// flush() hands everything buffered to the file.
+class ExportFile {
+ public:
+  ExportFile() = default;
+  ~ExportFile() { close(); }
+  ExportFile(const ExportFile&) = delete;
+  ExportFile& operator=(const ExportFile&) = delete;
+
+  /// Creates `path` empty, replacing an existing file, and opens it for
+  /// writing. False when it cannot be created.
+  bool create(const std::string& path);
+  /// Where the next line goes; call lineAdded() after appending to it.
+  std::string& buffer() { return buffer_; }
+  void lineAdded() {
+    if (buffer_.size() >= kBlockBytes) flush();
+  }
+  void flush();
+  void close();
+
+ private:
+  static constexpr std::size_t kBlockBytes = 64 * 1024;
+
+  int fd_ = -1;
+  std::string buffer_;
+};
+
+}  // namespace oslog
