@@ -31,6 +31,10 @@ void destroyTimerFn(void* userdata) { delete static_cast<std::function<void()>*>
 
 bool DaemonLoop::open(std::function<void()> onStop, std::string* error) {
   onStop_ = std::move(onStop);
+  // A shell starts background jobs with SIGINT ignored, and an ignored
+  // signal never reaches a signalfd; take both back before blocking them.
+  signal(SIGTERM, SIG_DFL);
+  signal(SIGINT, SIG_DFL);
   sigset_t mask;
   sigemptyset(&mask);
   sigaddset(&mask, SIGTERM);
