@@ -27,8 +27,8 @@ std::optional<TimestampKey> parseTimestamp(std::string_view ts) {
   constexpr std::string_view kShape = "0000-00-00-000000";
   if (ts.size() < kShape.size()) return std::nullopt;
   for (size_t i = 0; i < kShape.size(); ++i) {
-    bool digit = std::isdigit(static_cast<unsigned char>(ts[i])) != 0;
-    if ((kShape[i] == '0') != digit) return std::nullopt;
+    bool fits = kShape[i] == '0' ? std::isdigit(static_cast<unsigned char>(ts[i])) != 0 : ts[i] == kShape[i];
+    if (!fits) return std::nullopt;
   }
   TimestampKey key{std::string(ts.substr(0, kShape.size())), 1};
   std::string_view rest = ts.substr(kShape.size());
