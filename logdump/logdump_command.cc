@@ -1,0 +1,74 @@
+// SPDX-License-Identifier: MIT
+#include "logdump/logdump_command.h"
+
+#include <iostream>
+
+#include "logdump/baseband_collection.h"
+#include "logdump/logdump_options.h"
+#include "logdump/oslog_command.h"
+#include "logdump/telephony_collection.h"
+#include "logdump/trace_names.h"
+#include "tool/server_state.h"
+
+std::shared_ptr<LogdumpCommand> LogdumpCommand::create(std::string name,
+                                                       std::weak_ptr<CommandBase> parent,
+                                                       std::shared_ptr<vorn::client::Manager> manager,
+                                                       dispatch::queue queue) {
+  std::shared_ptr<LogdumpCommand> command(
+      new LogdumpCommand(std::move(name), std::move(parent), std::move(manager), std::move(queue)));
+  command->init();
+  return command;
+}
+
+bool LogdumpCommand::isAllowed(std::string name) {
+  // Baseband logs can still be located while the server is down.
+  if (name == "bb") return true;
+  if (IsServerRunning()) return true;
+  std::cerr << kServerDownErrorPrint << std::endl;
+  return false;
+}
+
+void LogdumpCommand::registerCommands() {
+  // The handlers are stored in this node's own table, so the node outlives them.
+  addCommandHandler(
+      "tel",
+      [this](dispatch::group group, std::list<std::string> args) {
+        return collectTelephonyLogs(*this, std::move(group), std::move(args), TelephonyDump::logs);
+      },
+      "[nocompress|tar.gz|tar] [nonui] <reason> collect telephony logs");
+  addCommandHandler(
+      "core",
+      [this](dispatch::group group, std::list<std::string> args) {
+        return collectTelephonyLogs(*this, std::move(group), std::move(args),
+                                    TelephonyDump::logsWithCoredump);
+      },
+      "[nocompress|tar.gz|tar] [nonui] <reason> collect telephony logs with coredump");
+  addCommandHandler(
+      "bb",
+      [this](dispatch::group, std::list<std::string> args) {
+        return collectBasebandLogs(*this, std::move(args));
+      },
+      "[nocompress|tar.gz|tar] <reason> collect baseband logs only");
+  addCommandHandler(
+      "oslog",
+      [](dispatch::group group, std::list<std::string> args) {
+        GroupMembership membership(std::move(group));
+        return logdump::runOsLogCommand(std::move(args));
+      },
+      "[history size] [output txt file path] -p <process1 process2..> -i <imagePath1 imagePath2..> "
+      "collect oslog to txt");
+}
+
+bool isSystemLogsTraceMode3(LogdumpCommand& command) {
+  xpc::dict request;
+  request.set(vorn::kKeyTraceName, xpc::object::string(vorn::kTraceSystemLogs));
+  request.set(vorn::kKeyTracePropertyName, xpc::object::string(vorn::kKeyTraceMode));
+  xpc::object response;
+  vorn::client::PerformCommand(command.getManager(), vorn::kCommandGetTraceProperty, request.obj(),
+                               response);
+  const std::string text =
+      xpc::dyn_cast_or_default(xpc::dict(response).get(vorn::kKeyTracePropertyValue), "");
+  bool valid = false;
+  const int mode = parseTraceMode(text, valid);
+  return valid && mode == 3;
+}

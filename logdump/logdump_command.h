@@ -1,0 +1,26 @@
+// SPDX-License-Identifier: MIT
+#pragma once
+
+#include <memory>
+#include <string>
+
+#include "tool/vorn_command_base.h"
+
+/// The "logdump" node: the "tel", "core", "bb" and "oslog" collections.
+/// Everything but "bb" needs a running server.
+class LogdumpCommand : public VornCommandBase {
+ public:
+  static std::shared_ptr<LogdumpCommand> create(std::string name, std::weak_ptr<CommandBase> parent,
+                                                std::shared_ptr<vorn::client::Manager> manager,
+                                                dispatch::queue queue);
+
+  bool isAllowed(std::string name) override;
+  void registerCommands() override;
+
+ private:
+  using VornCommandBase::VornCommandBase;
+};
+
+/// Asks the server for the system-logs trace mode; true only for a valid 3.
+/// Any failure counts as another mode.
+bool isSystemLogsTraceMode3(LogdumpCommand& command);

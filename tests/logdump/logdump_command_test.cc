@@ -1,0 +1,77 @@
+// SPDX-License-Identifier: MIT
+#include "logdump_fixture.h"
+
+namespace {
+
+class LogdumpPermission : public LogdumpTest {};
+
+TEST_F(LogdumpPermission, OnlyBbRunsWhileTheServerIsDown) {
+  gServerRunning = false;
+  struct Case {
+    std::string name;
+    bool allowed;
+  };
+  for (const auto& c : {Case{"bb", true}, Case{"tel", false}, Case{"core", false}, Case{"oslog", false},
+                        Case{"BB", false}}) {
+    StdioCapture io;
+    EXPECT_EQ(command->isAllowed(c.name), c.allowed) << c.name;
+    EXPECT_EQ(io.err(), c.allowed ? "" : "Server is not running. Please try after server starts.\n") << c.name;
+    EXPECT_EQ(io.out(), "");
+  }
+  gServerRunning = true;
+  StdioCapture io;
+  for (const std::string name : {"bb", "tel", "core", "oslog", "BB"}) EXPECT_TRUE(command->isAllowed(name));
+  EXPECT_EQ(io.err(), "");
+}
+
+TEST_F(LogdumpPermission, HelpListsTheFourHandlers) {
+  StdioCapture io;
+  command->displayHelp();
+  EXPECT_EQ(io.out(),
+            "\nOptions for command '\x1b[32mlogdump\x1b[39m':\n\n"
+            "\t              bb  -  [nocompress|tar.gz|tar] <reason> collect baseband logs only\n\n"
+            "\t            core  -  [nocompress|tar.gz|tar] [nonui] <reason> collect telephony logs with coredump\n\n"
+            "\t           oslog  -  [history size] [output txt file path] -p <process1 process2..> -i "
+            "<imagePath1 imagePath2..> collect oslog to txt\n\n"
+            "\t             tel  -  [nocompress|tar.gz|tar] [nonui] <reason> collect telephony logs\n\n"
+            "\t              cd  -  <sub-command>\n\t            help\n\t            back\n\t            quit\n\n");
+}
+
+TEST_F(LogdumpPermission, OslogWithTooFewWordsFails) {
+  for (const std::list<std::string>& typed : {std::list<std::string>{}, std::list<std::string>{"600"}}) {
+    auto r = run("oslog", typed);
+    EXPECT_FALSE(r.result);
+    EXPECT_EQ(r.out, "os log collection: Failed\n");
+  }
+}
+
+TEST(TraceNames, SuffixesFollowTheVendorSeenFirst) {
+  auto device = std::make_shared<FakeDevice>();
+  device->vendorCode = 2;
+  platform::SetDeviceInfo(device);
+  EXPECT_EQ(vorn::trace::getBasebandTraceDirSuffix(), "-bb-trace");
+  EXPECT_EQ(vorn::trace::getCoreDumpDirSuffix(), "-coredump");
+  device->vendorCode = 0;  // a running process keeps what it saw first
+  EXPECT_EQ(vorn::trace::getBasebandTraceDirSuffix(), "-bb-trace");
+  EXPECT_EQ(vorn::trace::getCoreDumpDirSuffix(), "-coredump");
+  platform::SetDeviceInfo(nullptr);
+}
+
+TEST(TraceNames, OtherVendorsGetTheShortSuffixes) {
+  GTEST_FLAG_SET(death_test_style, "threadsafe");
+  for (int vendor : {0, 1, 3}) {
+    // A fresh process, since the suffixes are fixed once per process.
+    EXPECT_EXIT(
+        {
+          auto device = std::make_shared<FakeDevice>();
+          device->vendorCode = vendor;
+          platform::SetDeviceInfo(device);
+          const bool ok = vorn::trace::getBasebandTraceDirSuffix() == "-diag" &&
+                          vorn::trace::getCoreDumpDirSuffix() == "-cd";
+          std::_Exit(ok ? 0 : 1);
+        },
+        testing::ExitedWithCode(0), "");
+  }
+}
+
+}  // namespace

@@ -1,0 +1,104 @@
+// SPDX-License-Identifier: MIT
+#include <gtest/gtest.h>
+
+#include <chrono>
+#include <thread>
+
+#include "../fakes/fake_device.h"
+#include "../fakes/fake_manager.h"
+#include "platform/device.h"
+#include "tool/server_state.h"
+#include "tool/vorn_command_base.h"
+#include "tool/vorn_shell.h"
+
+namespace {
+
+using namespace std::chrono_literals;
+using xpc::object;
+
+class ToolShell : public testing::Test {
+ protected:
+  void SetUp() override {
+    gServerRunning = false;
+    vorn::client::SetManagerFactory([this](const std::string& client, dispatch::queue queue) {
+      clientName = client;
+      queueLabel = queue.label();
+      manager = std::make_shared<FakeManager>(queue);
+      manager->setState(state);
+      return manager;
+    });
+  }
+  void TearDown() override {
+    vorn::client::SetManagerFactory(nullptr);
+    if (manager) manager->releaseHandlers();
+    gServerRunning = false;
+  }
+
+  /// Waits, with a deadline, until the flag reads `expected`.
+  static bool flagBecomes(bool expected) {
+    for (auto end = std::chrono::steady_clock::now() + 5s; std::chrono::steady_clock::now() < end;
+         std::this_thread::sleep_for(1ms))
+      if (IsServerRunning() == expected) return true;
+    return false;
+  }
+
+  std::optional<object> state;
+  std::shared_ptr<FakeManager> manager;
+  std::string clientName;
+  std::string queueLabel;
+};
+
+object stateIs(object value) { return object::dictionary({{"ServerState", value}}); }
+
+TEST_F(ToolShell, BuildsTheTreeOnOneConnectionAndQueue) {
+  VornShell shell;
+  auto root = shell.createRootCommand();
+  ASSERT_TRUE(root);
+  EXPECT_EQ(clientName, "vorntool");
+  EXPECT_EQ(queueLabel, "vorntool.queue");
+  EXPECT_EQ(root->getHierarchy(), std::string("/") + getprogname());
+  EXPECT_FALSE(root->isValidCommand("logdump"));
+  ASSERT_TRUE(root->isValidSubCommand("logdump"));
+  auto logdump = root->getSubCommandObj("logdump");
+  EXPECT_EQ(logdump->getParent().lock(), root);
+  EXPECT_EQ(logdump->getHierarchy(), std::string("/") + getprogname() + "/logdump");
+  auto* base = dynamic_cast<VornCommandBase*>(logdump.get());
+  ASSERT_NE(base, nullptr);
+  EXPECT_EQ(base->getManager(), manager);
+  EXPECT_EQ(base->getManager(), dynamic_cast<VornCommandBase*>(root.get())->getManager());
+}
+
+TEST_F(ToolShell, StartedStateWithinTheWaitSetsTheFlag) {
+  state = stateIs(object::string("Started"));
+  VornShell shell;
+  shell.createRootCommand();
+  EXPECT_TRUE(IsServerRunning());
+}
+
+TEST_F(ToolShell, OnlyTheExactStartedStringSetsTheFlag) {
+  const object payloads[] = {
+      stateIs(object::string("Starting")), stateIs(object::string("started")),
+      stateIs(object::string("")),         stateIs(object::int64(1)),
+      object::dictionary({}),              object::string("Started"),
+      object(),
+  };
+  for (const auto& payload : payloads) {
+    state = stateIs(object::string("Started"));
+    VornShell shell;
+    shell.createRootCommand();
+    ASSERT_TRUE(IsServerRunning());
+    manager->emit(payload);
+    EXPECT_TRUE(flagBecomes(false));
+    manager->releaseHandlers();
+  }
+}
+
+TEST_F(ToolShell, AServerThatStartsLaterIsSeenLater) {
+  VornShell shell;
+  auto root = shell.createRootCommand();
+  EXPECT_FALSE(IsServerRunning());
+  manager->emit(stateIs(object::string("Started")));
+  EXPECT_TRUE(flagBecomes(true));
+}
+
+}  // namespace

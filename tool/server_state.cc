@@ -1,0 +1,6 @@
+// SPDX-License-Identifier: MIT
+#include "tool/server_state.h"
+
+std::atomic<bool> gServerRunning{false};
+
+bool IsServerRunning() { return gServerRunning.load(); }

@@ -1,0 +1,35 @@
+// SPDX-License-Identifier: MIT
+#include "tool/startup.h"
+
+#include <cstdlib>
+#include <iostream>
+#include <list>
+#include <memory>
+#include <string>
+
+#include "platform/device.h"
+#include "tool/config.h"
+#include "tool/vorn_shell.h"
+
+bool passesStartupChecks() {
+  if (TelephonyRadiosGetRadio() == 0) {
+    std::cout << "'vorntool' is not supported on this product." << std::endl;
+    return false;
+  }
+  if (!config::hw::watch() && !rilx::isProcessRunning("Telhub") &&
+      !rilx::isProcessRunning("modemd")) {
+    std::cout << "Telhub process is not running. Please run/load Telhub (or modemd) and try again."
+              << std::endl;
+    return false;
+  }
+  return true;
+}
+
+void* RunShellThread(void* wordList) {
+  const std::list<std::string> words = *static_cast<std::list<std::string>*>(wordList);
+  // exit() does not unwind this stack: the shell, and with it the tree, the
+  // connection and the queue, stay alive until the process is gone.
+  auto shell = std::make_shared<VornShell>();
+  const bool ok = shell->run(words);
+  std::exit(ok ? 0 : 1);
+}
