@@ -114,13 +114,13 @@ object everyKind() {
 
 TEST_F(ClientOverBus, CarriesRequestsAndResponsesBothWays) {
   auto peer = startPeer(ScriptedPeer::Service::manager);
+  Recorder done;
   auto m = manager();
   object response;
   auto result = vorn::client::PerformCommand(m, "Echo", everyKind(), response);
   EXPECT_EQ(result.status, 0);
   EXPECT_EQ(response, everyKind());
 
-  Recorder done;
   vorn::client::PerformCommand(m, "Echo", done.completion(queue_), everyKind());
   ASSERT_TRUE(done.waitFor(1));
   auto calls = done.snapshot();
@@ -154,12 +154,12 @@ TEST_F(ClientOverBus, PassesTheServersStatusAndDropsItsResponseOnFailure) {
 
 TEST_F(ClientOverBus, RefusesARequestThatCannotBeEncoded) {
   auto peer = startPeer(ScriptedPeer::Service::manager);
+  Recorder done;
   auto m = manager();
   object bad = dict({{"reason", object::string("\xff not UTF-8")}});
   object response;
   EXPECT_EQ(vorn::client::PerformCommand(m, "Echo", bad, response).status, st::kBusError);
   EXPECT_TRUE(response.isNull());
-  Recorder done;
   vorn::client::PerformCommand(m, "Echo", done.completion(queue_), bad);
   ASSERT_TRUE(done.waitFor(1));
   EXPECT_EQ(done.snapshot()[0].result.status, st::kBusError);
@@ -244,8 +244,8 @@ TEST_F(ClientOverBus, DestroyingTheManagerCompletesPendingCallsOnTheQueue) {
   setenv("VORN_CALL_TIMEOUT_MS", "60000", 1);
   auto peer = startPeer(ScriptedPeer::Service::manager);
   peer->script(vorn::kCommandTraceDumpState, {Act::noReply, 0, {}});
-  auto m = manager();
   Recorder done;
+  auto m = manager();
   // Records where the completion's captures are released.
   struct Witness {
     dispatch::queue q;
@@ -276,8 +276,8 @@ TEST_F(ClientOverBus, DestroyingTheManagerCompletesPendingCallsOnTheQueue) {
 TEST_F(ClientOverBus, DeliversServerStateOnEventsOnAndLaterEvents) {
   auto peer = startPeer(ScriptedPeer::Service::manager);
   peer->setState(dict({{vorn::kKeyServerState, object::string("Started")}}));
+  Recorder events, others;  // outlive the manager that calls them
   auto m = manager();
-  Recorder events, others;
   vorn::client::RegisterEventHandler(m, vorn::kEventServerStateChange, events.handler(queue_));
   vorn::client::RegisterEventHandler(m, "Unrelated", others.handler(queue_));
   auto start = Clock::now();
@@ -317,8 +317,8 @@ TEST_F(ClientOverBus, DeliversNothingWhenHelloFails) {
       peer = startPeer(ScriptedPeer::Service::manager);
       peer->script("Hello", {*c.hello, 0, {}});
     }
-    auto m = manager();
     Recorder events;
+    auto m = manager();
     vorn::client::RegisterEventHandler(m, vorn::kEventServerStateChange, events.handler(queue_));
     vorn::client::EventsOn(m);
     // Answered after Hello on the same connection.
@@ -368,6 +368,7 @@ TEST_F(ClientOverBus, FailsWithoutABusAndConnectsOnceOneAppears) {
   std::string address = bus_->address();
   setenv("DBUS_SYSTEM_BUS_ADDRESS", ("unix:path=" + bus_->directory() + "/missing").c_str(), 1);
   std::ofstream(root_ + "/var/lib/vorn/trace.properties") << "SystemLogs.Mode=2\n";
+  Recorder done;
   auto m = manager();
   auto helper = vorn::HelperClient::create("logdump.helper", nullptr);
   ASSERT_TRUE(m);
@@ -384,7 +385,6 @@ TEST_F(ClientOverBus, FailsWithoutABusAndConnectsOnceOneAppears) {
                 .status,
             0);
   EXPECT_EQ(xpc::dyn_cast_or_default(response.get(vorn::kKeyTracePropertyValue), ""), "2");
-  Recorder done;
   vorn::client::PerformCommand(m, "Any", done.completion(queue_), dict({}));
   ASSERT_TRUE(done.waitFor(1));
   EXPECT_EQ(done.snapshot()[0].result.status, kNotRunning);
