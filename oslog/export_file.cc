@@ -10,6 +10,7 @@ namespace oslog {
 
 bool ExportFile::create(const std::string& path) {
   close();
+  writeError_ = 0;
   fd_ = ::open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666);
   buffer_.reserve(kBlockBytes + 4096);
   return fd_ >= 0;
@@ -17,21 +18,26 @@ bool ExportFile::create(const std::string& path) {
 
 void ExportFile::flush() {
   std::size_t done = 0;
-  while (fd_ >= 0 && done < buffer_.size()) {
+  // After a failed write (a full disk, say) nothing more is written: the
+  // file would have a hole in it. The failure is reported by close().
+  while (fd_ >= 0 && writeError_ == 0 && done < buffer_.size()) {
     const ssize_t n = ::write(fd_, buffer_.data() + done, buffer_.size() - done);
     if (n < 0 && errno == EINTR) continue;
-    // A full disk loses the rest of the block; the export has no one to tell.
-    if (n <= 0) break;
+    if (n <= 0) {
+      writeError_ = n < 0 ? errno : ENOSPC;
+      break;
+    }
     done += static_cast<std::size_t>(n);
   }
   buffer_.clear();
 }
 
-void ExportFile::close() {
-  if (fd_ < 0) return;
+bool ExportFile::close() {
+  if (fd_ < 0) return writeError_ == 0;
   flush();
-  ::close(fd_);
+  if (::close(fd_) != 0 && writeError_ == 0) writeError_ = errno;
   fd_ = -1;
+  return writeError_ == 0;
 }
 
 }  // namespace oslog

@@ -24,12 +24,16 @@ class ExportFile {
     if (buffer_.size() >= kBlockBytes) flush();
   }
   void flush();
-  void close();
+  /// Flushes and closes; false when any write so far, or the close, failed.
+  bool close();
+  /// The error of the first failed write (0 while every write succeeded).
+  int writeError() const { return writeError_; }
 
  private:
   static constexpr std::size_t kBlockBytes = 64 * 1024;
 
   int fd_ = -1;
+  int writeError_ = 0;
   std::string buffer_;
 };
 

@@ -3,6 +3,7 @@
 
 #include <cstdarg>
 #include <cstdio>
+#include <cstring>
 #include <memory>
 
 #include "oslog/export_file.h"
@@ -88,7 +89,9 @@ bool OsLogStream::putOsLogStreamToFile(logstore::Store& store, const std::string
     logError("Timeout on getting oslog stream");
   }
   // invalidate() has stopped the stream's thread, so the file is ours again.
-  state->file.close();
+  const bool written = state->file.close();
+  if (!written)
+    logError("Failed to write file: %s (%s)", path.c_str(), std::strerror(state->file.writeError()));
   stream.reset();
-  return ended;
+  return ended && written;
 }

@@ -147,6 +147,15 @@ TEST_F(AnExportOverAFakeStore, PathInAMissingFolderFailsAndLogsThePath) {
   EXPECT_THAT(logged(), ElementsAre("Failed to create file: " + out_));
 }
 
+TEST_F(AnExportOverAFakeStore, AFailedWriteFailsTheExport) {
+  FakeScript script;
+  script.events = {messageEvent(secondsAgo(5), "Telhub", "lost on a full disk")};
+  out_ = "/dev/full";
+  EXPECT_FALSE(run(script));
+  EXPECT_THAT(logged(), ElementsAre("Getting oslog stream: history = 600.000000",
+                                    "Failed to write file: /dev/full (No space left on device)"));
+}
+
 TEST(AStream, ReportsItsEndExactlyOnce) {
   struct Case {
     bool activate;
