@@ -8,7 +8,7 @@
 
 namespace {
 
-const TestCommand::Spec kTree{
+const TestCommand::Layout kTree{
     "vorntool",
     {},
     {{"logdump",

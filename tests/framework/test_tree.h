@@ -14,29 +14,29 @@
 /// framework without the tool.
 class TestCommand : public CommandBase {
  public:
-  struct Spec {
+  struct Layout {
     std::string name;
     std::vector<std::pair<std::string, std::string>> handlers;  // name, help
-    std::vector<Spec> children;
+    std::vector<Layout> children;
     std::vector<std::string> refused;  // names isAllowed refuses
   };
 
-  static std::shared_ptr<TestCommand> create(Spec spec, std::weak_ptr<CommandBase> parent,
+  static std::shared_ptr<TestCommand> create(Layout layout, std::weak_ptr<CommandBase> parent,
                                              std::vector<std::string>* calls) {
-    auto node = std::shared_ptr<TestCommand>(new TestCommand(std::move(spec), parent, calls));
+    auto node = std::shared_ptr<TestCommand>(new TestCommand(std::move(layout), parent, calls));
     node->init();
     return node;
   }
 
   bool isAllowed(std::string name) override {
-    for (auto& r : spec_.refused)
+    for (auto& r : layout_.refused)
       if (r == name) return false;
     return true;
   }
 
   void registerCommands() override {
-    for (auto& [handler, help] : spec_.handlers) {
-      std::string label = spec_.name + ":" + handler;
+    for (auto& [handler, help] : layout_.handlers) {
+      std::string label = layout_.name + ":" + handler;
       auto* calls = calls_;
       addCommandHandler(
           handler,
@@ -49,28 +49,28 @@ class TestCommand : public CommandBase {
           },
           help);
     }
-    for (auto& child : spec_.children)
+    for (auto& child : layout_.children)
       addSubCommand(child.name, create(child, weak_from_this(), calls_));
   }
 
  private:
-  TestCommand(Spec spec, std::weak_ptr<CommandBase> parent, std::vector<std::string>* calls)
-      : CommandBase(spec.name, std::move(parent)), spec_(std::move(spec)), calls_(calls) {}
-  Spec spec_;
+  TestCommand(Layout layout, std::weak_ptr<CommandBase> parent, std::vector<std::string>* calls)
+      : CommandBase(layout.name, std::move(parent)), layout_(std::move(layout)), calls_(calls) {}
+  Layout layout_;
   std::vector<std::string>* calls_;
 };
 
-/// A shell over a tree made from a spec.
+/// A shell over a tree made from a layout.
 class TestShell : public CommandShell {
  public:
-  explicit TestShell(TestCommand::Spec spec, std::vector<std::string>* calls = nullptr)
-      : spec_(std::move(spec)), calls_(calls) {}
+  explicit TestShell(TestCommand::Layout layout, std::vector<std::string>* calls = nullptr)
+      : layout_(std::move(layout)), calls_(calls) {}
   std::shared_ptr<CommandBase> createRootCommand() override {
-    if (spec_.name.empty()) return nullptr;
-    return TestCommand::create(spec_, {}, calls_);
+    if (layout_.name.empty()) return nullptr;
+    return TestCommand::create(layout_, {}, calls_);
   }
 
  private:
-  TestCommand::Spec spec_;
+  TestCommand::Layout layout_;
   std::vector<std::string>* calls_;
 };

@@ -37,16 +37,6 @@ TEST(LogdumpOptions, ParsesOptionsUntilTheReason) {
   }
 }
 
-TEST(LogdumpOptions, ParserNeverResetsWhatTheCallerPreset) {
-  std::list<std::string> args{"why"};
-  CompressionMode compression = None;
-  std::string reason;
-  bool nonui = true;
-  parseLogdumpOptions(args, compression, reason, nonui);
-  EXPECT_EQ(compression, None);
-  EXPECT_TRUE(nonui);
-}
-
 TEST(TraceMode, NamedModesAndWholeIntegers) {
   struct Case {
     std::string text;

@@ -5,20 +5,6 @@
 
 namespace {
 
-TEST(XpcObject, KindsAndTypedViews) {
-  EXPECT_EQ(xpc::object().kind(), xpc::type::null);
-  EXPECT_EQ(*xpc::object::string("s").asString(), "s");
-  EXPECT_EQ(*xpc::object::int64(-5).asInt64(), -5);
-  EXPECT_EQ(*xpc::object::uint64(5).asUint64(), 5u);
-  EXPECT_EQ(*xpc::object::boolean(true).asBool(), true);
-  EXPECT_EQ(*xpc::object::dbl(0.5).asDouble(), 0.5);
-  EXPECT_EQ(xpc::object::array({xpc::object::int64(1)}).asArray()->size(), 1u);
-  // Views of another kind are empty rather than converting.
-  EXPECT_EQ(xpc::object::int64(1).asUint64(), nullptr);
-  EXPECT_EQ(xpc::object::string("1").asInt64(), nullptr);
-  EXPECT_EQ(xpc::object().asString(), nullptr);
-}
-
 TEST(XpcDict, KeepsInsertionOrderAndReplacesInPlace) {
   xpc::dict d;
   d.set("b", xpc::object::string("1"));
@@ -49,12 +35,6 @@ TEST(XpcDict, NonDictionaryStandsForNull) {
     EXPECT_TRUE(d.get("x").isNull());
   }
   EXPECT_TRUE(xpc::dict(xpc::object::dictionary({})).valid());
-}
-
-TEST(XpcDyncast, StringOrFallback) {
-  EXPECT_EQ(xpc::dyn_cast_or_default(xpc::object::string(""), "d"), "");
-  EXPECT_EQ(xpc::dyn_cast_or_default(xpc::object::int64(3), "d"), "d");
-  EXPECT_EQ(xpc::dyn_cast_or_default(xpc::object(), "d"), "d");
 }
 
 TEST(XpcObject, EqualityIsByValue) {
