@@ -1,330 +1,298 @@
 // SPDX-License-Identifier: MIT
 // vornd and vorn-helper, built, on a private bus with the project's policy.
+#include <archive.h>
+#include <archive_entry.h>
 #include <gtest/gtest.h>
-#include <signal.h>
 #include <unistd.h>
 
+#include <atomic>
 #include <filesystem>
 #include <fstream>
-#include <memory>
+#include <functional>
+#include <map>
+#include <list>
+#include <optional>
 #include <set>
+#include <thread>
 
-#include "archive_listing.h"
-#include "bus_harness.h"
 #include "platform/vorn_constants.h"
-#include "temp_dir.h"
+#include "server/common/bus_handles.h"
+#include "server/common/bus_values.h"
+#include "tests/support/private_bus.h"
 
-using namespace harness;
 namespace fs = std::filesystem;
+using namespace std::chrono_literals;
 using xpc::object;
+using vorn::status::kBadRequest;
+using vorn::status::kCollectionFailed;
 
 namespace {
 
-object dict(std::vector<xpc::entry> entries) { return object::dictionary(std::move(entries)); }
+struct Reply {
+  std::string error;  // D-Bus error name; empty on a method return
+  int status = 0;
+  object response;
+};
 
-object telRequest(int compression = 1, std::string reason = "e2e") {
-  return dict({{"TraceAction", object::string("CollectTelephonyLogs")},
-               {"TraceDumpStateReason", object::string(std::move(reason))},
-               {"TraceDumpStatePerformCompression", object::int64(compression)}});
+object dict(std::vector<xpc::entry> entries) { return object::dictionary(std::move(entries)); }
+std::string text(const object& response, const char* key) { return xpc::dyn_cast_or_default(response.get(key), ""); }
+
+object collect(const char* action, std::optional<int> compression) {
+  std::vector<xpc::entry> entries = {{"TraceAction", object::string(action)},
+                                     {"TraceDumpStateReason", object::string("e2e")}};
+  if (compression) entries.push_back({"TraceDumpStatePerformCompression", object::int64(*compression)});
+  return dict(std::move(entries));
 }
 
 std::set<std::string> namesIn(const fs::path& dir) {
   std::set<std::string> names;
-  std::error_code ec;
-  for (fs::directory_iterator it(dir, ec); !ec && it != fs::directory_iterator(); it.increment(ec)) {
-    names.insert(it->path().filename().string());
-  }
+  if (fs::exists(dir)) for (const auto& e : fs::directory_iterator(dir)) names.insert(e.path().filename().string());
   return names;
+}
+
+/// An archive read back with libarchive: entry name -> contents, and the
+/// compression filter found; `readable` once it was read to the end.
+struct Listing {
+  bool readable = false;
+  int filter = ARCHIVE_FILTER_NONE;
+  std::map<std::string, std::string> entries;
+};
+
+Listing listArchive(const fs::path& path) {
+  Listing out;
+  archive* a = archive_read_new();
+  archive_read_support_filter_all(a);
+  archive_read_support_format_all(a);
+  archive_entry* entry = nullptr;
+  int r = archive_read_open_filename(a, path.c_str(), 10240);
+  while (r == ARCHIVE_OK && (r = archive_read_next_header(a, &entry)) == ARCHIVE_OK) {
+    std::string& data = out.entries[archive_entry_pathname(entry)];
+    char buf[8192];
+    for (la_ssize_t n = 0; (n = archive_read_data(a, buf, sizeof buf)) > 0;) data.append(buf, size_t(n));
+  }
+  out.readable = r == ARCHIVE_EOF;
+  out.filter = archive_filter_code(a, 0);
+  archive_read_free(a);
+  return out;
+}
+
+/// Calls org.vorn.<service> on a connection of its own; `append` writes the
+/// arguments. A D-Bus error gives status -1 and its name.
+Reply call(const std::string& service, const char* member, const std::function<int(sd_bus_message*)>& append) {
+  sd_bus* raw = nullptr;
+  if (sd_bus_open_system(&raw) < 0) return {"test.NoBus", -1, {}};
+  vorn::server::BusPtr bus(raw);
+  const std::string name = "org.vorn." + service;
+  sd_bus_message* m = nullptr;
+  sd_bus_message_new_method_call(raw, &m, name.c_str(), ("/org/vorn/" + service).c_str(), (name + "1").c_str(), member);
+  vorn::server::MessagePtr message(m);
+  if (m == nullptr || append(m) < 0) return {"test.CannotBuild", -1, {}};
+  sd_bus_error error = SD_BUS_ERROR_NULL;
+  sd_bus_message* r = nullptr;
+  Reply out;
+  if (sd_bus_call(raw, m, 60'000'000, &error, &r) < 0) out = {error.name ? error.name : "test.CallFailed", -1, {}};
+  sd_bus_error_free(&error);
+  vorn::server::MessagePtr reply(r);
+  const char* description = nullptr;  // (isa{sv}) for commands, (a{sv}) for Hello
+  bool isStatus = out.error.empty() && sd_bus_message_get_signature(r, 1)[0] == 'i';
+  if (out.error.empty() && ((isStatus && sd_bus_message_read(r, "is", &out.status, &description) < 0) ||
+                            !vorn::server::readDictionary(r, &out.response))) {
+    out = {"test.BadReply", -1, {}};
+  }
+  return out;
+}
+
+Reply hello() { return call("Manager", "Hello", [](sd_bus_message* m) { return sd_bus_message_append(m, "s", "t"); }); }
+std::string serverState() { return text(hello().response, "ServerState"); }
+
+Reply perform(const std::string& command, const object& request) {
+  return call("Manager", "PerformCommand", [&](sd_bus_message* m) {
+    int r = sd_bus_message_append(m, "ss", "test", command.c_str());
+    return r < 0 ? r : vorn::server::appendDictionary(m, request) ? 0 : -EINVAL;
+  });
+}
+
+Reply diagsnapStatus(std::uint32_t task = 4, const char* command = "DiagsnapStatus") {
+  return call("Helper", "Perform", [&](sd_bus_message* m) {
+    int r = sd_bus_message_append(m, "sus", "test", task, command);
+    return r < 0 ? r : vorn::server::appendDictionary(m, dict({{"Timeout", object::int64(1500)}})) ? 0 : -EINVAL;
+  });
 }
 
 }  // namespace
 
-class DaemonsOnPrivateBus : public ::testing::Test {
- protected:
+class Daemons : public ::testing::Test {
+ public:
   void SetUp() override {
     if (geteuid() != 0) GTEST_SKIP() << "the bus policy lets only root own org.vorn.Manager and org.vorn.Helper";
-    root.write("etc/vorn/device.conf", "radio=1\nproduct=1\nvendor=2\nbuild=internal\n");
-    root.write("var/log/vorn/telhub.log", "telhub up\n");
-    root.write("var/wireless/Library/Logs/ZelmarBasebandManager/bbmgr.log", "bb up\n");
-    root.write("var/lib/vorn/modem/ram.bin", "core");
-    bus = std::make_unique<PrivateBus>(busDir.path().string(), VORN_BUS_CONF);
-    ASSERT_TRUE(bus->ok()) << "dbus-daemon did not start";
-    ASSERT_TRUE(client.connect(bus->address()));
+    bus.emplace();
+    ASSERT_TRUE(bus->ok()) << bus->error();
+    root = fs::path(bus->directory()) / "root";
+    write("etc/vorn/device.conf", "radio=1\nproduct=1\nvendor=2\nbuild=internal\n");
+    write("var/log/vorn/telhub.log", "telhub up\n");
+    write("var/wireless/Library/Logs/ZelmarBasebandManager/bbmgr.log", "bb up\n");
+    write("var/lib/vorn/modem/ram.bin", "core");
   }
 
-  void startVornd(std::vector<std::string> args = {}, std::optional<unsigned long> fileSizeLimit = std::nullopt) {
-    std::vector<std::string> argv = {VORND_PATH, "--root", root.path().string()};
-    argv.insert(argv.end(), args.begin(), args.end());
-    ASSERT_TRUE(vornd.start(argv, {bus->env()}, -1, fileSizeLimit));
-    ASSERT_TRUE(client.waitFor([&] { return client.hasOwner("org.vorn.Manager"); }, 10s));
+  void write(const std::string& rel, const std::string& data) const {
+    fs::create_directories((root / rel).parent_path());
+    std::ofstream(root / rel, std::ios::binary) << data;
   }
 
-  void startHelper(std::vector<std::string> args = {}) {
-    std::vector<std::string> argv = {VORN_HELPER_PATH, "--root", root.path().string()};
-    argv.insert(argv.end(), args.begin(), args.end());
-    ASSERT_TRUE(helper.start(argv, {bus->env()}));
-    ASSERT_TRUE(client.waitFor([&] { return client.hasOwner("org.vorn.Helper"); }, 10s));
-  }
-
-  bool sawState(const std::string& state) const {
-    for (const auto& e : client.events()) {
-      if (e.name == "ServerStateChange" && e.state == state) return true;
+  /// Runs `argv` with "--root <root>" appended until `ready` gets an answer.
+  void start(std::vector<std::string> argv, Reply (*ready)() = hello) {
+    argv.insert(argv.end(), {"--root", root.string()});
+    daemons.emplace_back(vorn::test::ChildProcess::Options{argv, {}, -1, ""});
+    for (auto deadline = std::chrono::steady_clock::now() + 10s; !ready().error.empty();
+         std::this_thread::sleep_for(10ms)) {
+      ASSERT_LT(std::chrono::steady_clock::now(), deadline) << argv[0] << " did not come up";
     }
-    return false;
   }
 
-  fs::path folder() const { return root.path() / "var/wireless/Library/Logs/CrashReporter/Baseband"; }
+  fs::path folder() const { return root / "var/wireless/Library/Logs/CrashReporter/Baseband"; }
 
-  TempDir root, busDir;
-  std::unique_ptr<PrivateBus> bus;
-  Client client;
-  Process vornd, helper;
+  std::optional<vorn::test::PrivateBus> bus;
+  fs::path root;
+  std::list<vorn::test::ChildProcess> daemons;  // ended before the bus goes
 };
 
-TEST_F(DaemonsOnPrivateBus, AnnouncesStartedAndStopsCleanlyOnSigterm) {
-  startVornd();
-  ASSERT_TRUE(client.waitFor([&] { return sawState("Started"); }, 10s));
-  auto hello = client.hello();
-  ASSERT_EQ(hello.error, "");
-  EXPECT_EQ(xpc::dyn_cast_or_default(hello.response.get("ServerState"), ""), "Started");
-  // The missing properties file was written back with the defaults.
-  std::ifstream props(root.path() / "var/lib/vorn/trace.properties");
-  std::string text((std::istreambuf_iterator<char>(props)), std::istreambuf_iterator<char>());
-  EXPECT_EQ(text, "Baseband.Enabled=1\nSystemLogs.Mode=1\n");
-
-  vornd.signal(SIGTERM);
-  EXPECT_TRUE(client.waitFor([&] { return sawState("Stopping") && !client.hasOwner("org.vorn.Manager"); }, 10s));
-  EXPECT_EQ(vornd.waitExit(10s), 0);
+TEST_F(Daemons, HelloSaysStartingUntilTheDelayedStart) {
+  start({VORND_PATH, "--start-delay-ms", "1500"});
+  EXPECT_EQ(serverState(), "Starting");
+  auto deadline = std::chrono::steady_clock::now() + 10s;
+  while (serverState() != "Started" && std::chrono::steady_clock::now() < deadline) std::this_thread::sleep_for(50ms);
+  EXPECT_EQ(serverState(), "Started");
 }
 
-TEST_F(DaemonsOnPrivateBus, ReportsStartingUntilTheDelayedAnnouncement) {
-  startVornd({"--start-delay-ms", "1500", "--state", "Warming"});
-  auto early = client.hello();
-  ASSERT_EQ(early.error, "");
-  EXPECT_EQ(xpc::dyn_cast_or_default(early.response.get("ServerState"), ""), "Starting");
-  EXPECT_FALSE(sawState("Warming"));
-  ASSERT_TRUE(client.waitFor([&] { return sawState("Warming"); }, 10s));
-  EXPECT_FALSE(sawState("Started"));
-  EXPECT_EQ(xpc::dyn_cast_or_default(client.hello().response.get("ServerState"), ""), "Warming");
-}
-
-TEST_F(DaemonsOnPrivateBus, AnswersTracePropertiesFromTheFile) {
-  root.write("var/lib/vorn/trace.properties", "SystemLogs.Mode=3\n");
-  startVornd();
+TEST_F(Daemons, AnswersTracePropertiesAndRefusesTheUnknown) {
+  write("var/lib/vorn/trace.properties", "SystemLogs.Mode=3\n");
+  start({VORND_PATH});
+  auto property = [](const char* trace, const char* name) {
+    return dict({{"TraceName", object::string(trace)}, {"TracePropertyName", object::string(name)}});
+  };
   struct Case {
+    std::string command;
     object request;
     int status;
     const char* value;
   } cases[] = {
-      {dict({{"TraceName", object::string("SystemLogs")}, {"TracePropertyName", object::string("Mode")}}), 0, "3"},
-      {dict({{"TraceName", object::string("Baseband")}, {"TracePropertyName", object::string("Enabled")}}), 0, "1"},
-      {dict({{"TraceName", object::string("Baseband")}, {"TracePropertyName", object::string("Nope")}}),
-       vorn::status::kBadRequest, nullptr},
-      {dict({{"TraceName", object::string("Baseband")}}), vorn::status::kBadRequest, nullptr},
-      {dict({{"TraceName", object::string("Baseband")}, {"TracePropertyName", object::int64(1)}}),
-       vorn::status::kBadRequest, nullptr},
+      {"GetTraceProperty", property("SystemLogs", "Mode"), 0, "3"},
+      {"GetTraceProperty", property("Baseband", "Enabled"), 0, "1"},  // a default the file does not set
+      {"GetTraceProperty", property("Baseband", "Nope"), kBadRequest, ""},
+      {"GetTraceProperty", dict({{"TraceName", object::string("Baseband")}}), kBadRequest, ""},
+      {"TraceDumpState", dict({{"TraceAction", object::string("CollectEverything")}}), kBadRequest, ""},
+      {"Reboot", dict({}), kBadRequest, ""},
   };
   for (const auto& c : cases) {
-    auto reply = client.perform("GetTraceProperty", c.request);
-    ASSERT_EQ(reply.error, "");
-    EXPECT_EQ(reply.status, c.status);
-    if (c.value != nullptr) {
-      EXPECT_EQ(xpc::dyn_cast_or_default(reply.response.get("TracePropertyValue"), "?"), c.value);
-    } else {
-      EXPECT_TRUE(reply.response.asEntries() == nullptr || reply.response.asEntries()->empty());
-    }
+    auto reply = perform(c.command, c.request);
+    EXPECT_EQ(reply.status, c.status) << c.command << reply.error;
+    EXPECT_EQ(text(reply.response, "TracePropertyValue"), c.value) << c.command;
   }
+  EXPECT_TRUE(namesIn(folder()).empty());
 }
 
-TEST_F(DaemonsOnPrivateBus, TelephonyCollectionIsAnArchiveOfManifestAndLogs) {
-  startVornd();
-  auto reply = client.perform("TraceDumpState", dict({{"TraceAction", object::string("CollectTelephonyLogs")},
-                                                      {"TraceDumpStateReason", object::string("e2e")}}));
-  ASSERT_EQ(reply.error, "");
-  ASSERT_EQ(reply.status, 0) << reply.description;
-  const std::string ts = xpc::dyn_cast_or_default(reply.response.get("TimestampString"), "");
-  ASSERT_FALSE(ts.empty());
-  EXPECT_EQ(namesIn(folder()), std::set<std::string>{"log-bb-" + ts + ".tar.gz"});
-  auto listing = listArchive(folder() / ("log-bb-" + ts + ".tar.gz"));
-  ASSERT_TRUE(listing.readable);
-  const std::string dir = "log-bb-" + ts + "-tel/";
-  EXPECT_EQ(listing.filter, ARCHIVE_FILTER_GZIP);
-  EXPECT_EQ(listing.entries[dir + "vorn/telhub.log"], "telhub up\n");
-  EXPECT_EQ(listing.entries[dir + "ZelmarBasebandManager/bbmgr.log"], "bb up\n");
-  EXPECT_NE(listing.entries[dir + "manifest.txt"].find("reason: e2e\n"), std::string::npos);
-  EXPECT_EQ(listing.entries.count(dir + "coredump/ram.bin"), 0u);
+TEST_F(Daemons, CompressedCollectionIsAnArchiveOfManifestAndLogs) {
+  start({VORND_PATH});
+  struct Case {
+    std::optional<int> compression;
+    const char* extension;
+    int filter;
+  } cases[] = {{std::nullopt, ".tar.gz", ARCHIVE_FILTER_GZIP}, {2, ".tar", ARCHIVE_FILTER_NONE}};
+  std::set<std::string> made;
+  for (const auto& c : cases) {
+    auto reply = perform("TraceDumpState", collect("CollectTelephonyLogs", c.compression));
+    ASSERT_EQ(reply.status, 0) << reply.error;
+    const std::string ts = text(reply.response, "TimestampString");
+    made.insert("log-bb-" + ts + c.extension);
+    auto listing = listArchive(folder() / ("log-bb-" + ts + c.extension));
+    ASSERT_TRUE(listing.readable) << c.extension;
+    EXPECT_EQ(listing.filter, c.filter);
+    const std::string dir = "log-bb-" + ts + "-tel/";
+    EXPECT_EQ(listing.entries[dir + "vorn/telhub.log"], "telhub up\n");
+    EXPECT_EQ(listing.entries[dir + "ZelmarBasebandManager/bbmgr.log"], "bb up\n");
+    EXPECT_NE(listing.entries[dir + "manifest.txt"].find("reason: e2e\n"), std::string::npos);
+    EXPECT_EQ(listing.entries.count(dir + "coredump/ram.bin"), 0u);
+  }
+  EXPECT_EQ(namesIn(folder()), made);  // the directories were removed once packed
 }
 
-TEST_F(DaemonsOnPrivateBus, NocompressLeavesADirectoryTheHelperReports) {
-  startVornd();
-  startHelper();
-  auto none = client.helper(4, "DiagsnapStatus", dict({{"Timeout", object::int64(1500)}}));
-  ASSERT_EQ(none.error, "");
-  EXPECT_EQ(none.status, vorn::status::kCollectionFailed);
+TEST_F(Daemons, NocompressLeavesDirectoriesTheHelperReportsTheNewestOf) {
+  start({VORND_PATH});
+  start({VORN_HELPER_PATH}, [] { return diagsnapStatus(); });
+  EXPECT_EQ(diagsnapStatus().status, kCollectionFailed);
 
   std::string newest;
   for (int i = 0; i < 2; ++i) {
-    auto reply = client.perform("TraceDumpState", dict({{"TraceAction", object::string("CollectBasebandLogs")},
-                                                        {"TraceDumpStatePerformCompression", object::int64(0)}}));
-    ASSERT_EQ(reply.status, 0) << reply.description;
-    newest = xpc::dyn_cast_or_default(reply.response.get("TimestampString"), "");
-    EXPECT_TRUE(fs::is_regular_file(folder() / ("log-bb-" + newest + "-bb-trace") / "manifest.txt"));
+    auto reply = perform("TraceDumpState", collect("CollectBasebandLogs", 0));
+    ASSERT_EQ(reply.status, 0) << reply.error;
+    newest = text(reply.response, "TimestampString");
+    EXPECT_TRUE(fs::is_regular_file(folder() / ("log-bb-" + newest + "-bb-trace") / "manifest.txt")) << newest;
   }
-  // A telephony collection afterwards is not a baseband snapshot.
-  ASSERT_EQ(client.perform("TraceDumpState", telRequest(0)).status, 0);
-  auto found = client.helper(4, "DiagsnapStatus", dict({{"Timeout", object::int64(1500)}}));
-  ASSERT_EQ(found.error, "");
+  auto core = perform("TraceDumpState", collect("CollectTelephonyLogsWithCoredump", 0));
+  ASSERT_EQ(core.status, 0) << core.error;
+  EXPECT_EQ(fs::file_size(folder() / ("log-bb-" + text(core.response, "TimestampString") + "-coredump") /
+                          "coredump/ram.bin"), 4u);
+  // The core dump afterwards is not a baseband snapshot.
+  auto found = diagsnapStatus();
   EXPECT_EQ(found.status, 0);
-  EXPECT_EQ(xpc::dyn_cast_or_default(found.response.get("TimestampString"), ""), newest);
-
-  struct Case {
-    std::uint32_t task;
-    const char* command;
-  } bad[] = {{3, "DiagsnapStatus"}, {4, "diagsnapstatus"}, {4, "Other"}};
-  for (const auto& c : bad) {
-    EXPECT_EQ(client.helper(c.task, c.command, dict({})).status, vorn::status::kBadRequest) << c.command;
-  }
+  EXPECT_EQ(text(found.response, "TimestampString"), newest);
+  EXPECT_EQ(diagsnapStatus(3).status, kBadRequest);
+  EXPECT_EQ(diagsnapStatus(4, "Other").status, kBadRequest);
 }
 
-TEST_F(DaemonsOnPrivateBus, CollectionsQueueWhileHelloIsAnsweredAtOnce) {
-  // Incompressible data keeps each collection busy for a noticeable time.
-  {
-    std::ifstream random("/dev/urandom", std::ios::binary);
-    std::string data(24 << 20, '\0');
-    random.read(data.data(), static_cast<std::streamsize>(data.size()));
-    root.write("var/log/vorn/big.bin", data);
+TEST_F(Daemons, ConcurrentRequestsEachGetTheirOwnCollection) {
+  std::string data(24 << 20, '\0');  // incompressible: each collection takes a noticeable time
+  std::ifstream("/dev/urandom", std::ios::binary).read(data.data(), std::streamsize(data.size()));
+  write("var/log/vorn/big.bin", data);
+  start({VORND_PATH});
+  Reply replies[3];
+  std::atomic<int> finished{0};
+  std::vector<std::thread> clients;
+  for (auto& r : replies) {
+    clients.emplace_back([&] {
+      r = perform("TraceDumpState", collect("CollectTelephonyLogs", 1));
+      ++finished;
+    });
   }
-  startVornd();
-  constexpr int kCount = 3;
-  Reply replies[kCount];
-  bool done[kCount] = {false, false, false};
-  for (int i = 0; i < kCount; ++i) ASSERT_TRUE(client.performAsync("TraceDumpState", telRequest(), &replies[i], &done[i]));
-  auto hello = client.hello();
-  EXPECT_EQ(hello.error, "");
-  EXPECT_FALSE(done[kCount - 1]) << "the last collection ended before Hello was answered";
-  ASSERT_TRUE(client.waitFor([&] { return done[0] && done[1] && done[2]; }, 60s));
-  std::set<std::string> stamps;
+  std::this_thread::sleep_for(100ms);
+  EXPECT_EQ(serverState(), "Started");
+  EXPECT_LT(finished, 3) << "every collection ended before Hello was answered";
+  for (auto& t : clients) t.join();
+  std::set<std::string> archives;
   for (const auto& r : replies) {
-    EXPECT_EQ(r.status, 0) << r.description;
-    stamps.insert(xpc::dyn_cast_or_default(r.response.get("TimestampString"), ""));
+    EXPECT_EQ(r.status, 0) << r.error;
+    archives.insert("log-bb-" + text(r.response, "TimestampString") + ".tar.gz");
   }
-  EXPECT_EQ(stamps.size(), 3u);
-  EXPECT_EQ(namesIn(folder()).size(), 3u);
+  EXPECT_EQ(namesIn(folder()), archives);
+  EXPECT_EQ(archives.size(), 3u);
 }
 
-TEST_F(DaemonsOnPrivateBus, FailedCollectionsLeaveNoArchive) {
-  struct Case {
-    const char* label;
-    std::function<void()> setup;
-    std::optional<unsigned long> fileSizeLimit;
-  } cases[] = {
-      {"source is not a folder",
-       [&] {
-         fs::remove_all(root.path() / "var/log/vorn");
-         root.write("var/log/vorn", "not a folder");
-       },
-       std::nullopt},
-      // A file-size limit fails writes the way a full disk does.
-      {"no room",
-       [&] {
-         fs::remove_all(root.path() / "var/log/vorn");
-         root.write("var/log/vorn/telhub.log", "telhub up\n");
-         root.write("var/lib/vorn/modem/ram.bin", std::string(1 << 20, 'x'));
-       },
-       256 << 10},
-  };
-  for (const auto& c : cases) {
-    SCOPED_TRACE(c.label);
-    c.setup();
-    startVornd({}, c.fileSizeLimit);
-    auto reply = client.perform("TraceDumpState", dict({{"TraceAction", object::string("CollectTelephonyLogsWithCoredump")}}));
-    ASSERT_EQ(reply.error, "");
-    EXPECT_EQ(reply.status, vorn::status::kCollectionFailed);
-    EXPECT_TRUE(reply.response.asEntries() == nullptr || reply.response.asEntries()->empty());
-    EXPECT_EQ(namesIn(folder()), std::set<std::string>{});
-    // The server lives on and still answers.
-    EXPECT_EQ(client.hello().error, "");
-    vornd.terminate();
-    ASSERT_TRUE(client.waitFor([&] { return !client.hasOwner("org.vorn.Manager"); }, 10s));
-  }
-}
+// A collection that fails answers 0xE0200002 and leaves nothing behind.
+struct Failure {
+  const char* label;
+  const char* file;  // written once the telephony logs are gone
+  std::string data;
+  std::vector<std::string> argv;
+};
 
-TEST_F(DaemonsOnPrivateBus, TestSwitchesMisbehaveOnPurpose) {
-  startVornd({"--fail", "TraceDumpState=0xE0200003", "--no-reply", "GetTraceProperty", "--reply-delay-ms", "300",
-              "--exit-on", "Shutdown"});
-  auto failed = client.perform("TraceDumpState", telRequest());
-  EXPECT_EQ(failed.status, vorn::status::kBusy);
-  EXPECT_TRUE(failed.response.asEntries() == nullptr || failed.response.asEntries()->empty());
-  EXPECT_EQ(namesIn(folder()), std::set<std::string>{});
+class FailedCollection : public Daemons, public ::testing::WithParamInterface<Failure> {};
 
-  auto before = Clock::now();
-  EXPECT_EQ(client.hello().error, "");
-  EXPECT_GE(Clock::now() - before, 300ms);
-
-  auto silent = client.perform("GetTraceProperty",
-                               dict({{"TraceName", object::string("Baseband")},
-                                     {"TracePropertyName", object::string("Enabled")}}),
-                               800ms);
-  EXPECT_EQ(silent.error, "org.freedesktop.DBus.Error.Timeout");
-
-  auto gone = client.perform("Shutdown", dict({}));
-  EXPECT_NE(gone.error, "");
-  EXPECT_TRUE(vornd.waitExit(10s).has_value());
-  EXPECT_TRUE(client.waitFor([&] { return !client.hasOwner("org.vorn.Manager"); }, 10s));
-}
-
-TEST_F(DaemonsOnPrivateBus, HelperSwitchesFailAndDelay) {
-  fs::create_directories(folder() / "log-bb-2024-01-01-000000-bb-trace");
-  startHelper({"--fail", "0xE0200001", "--reply-delay-ms", "200"});
-  auto before = Clock::now();
-  auto reply = client.helper(4, "DiagsnapStatus", dict({{"Timeout", object::int64(1500)}}));
-  EXPECT_GE(Clock::now() - before, 200ms);
-  EXPECT_EQ(reply.status, vorn::status::kBadRequest);
+TEST_P(FailedCollection, LeavesNoArchiveAndTheServerGoesOn) {
+  fs::remove_all(root / "var/log/vorn");
+  write(GetParam().file, GetParam().data);
+  start(GetParam().argv);
+  auto reply = perform("TraceDumpState", collect("CollectTelephonyLogsWithCoredump", 1));
+  EXPECT_EQ(reply.status, kCollectionFailed) << reply.error;
   EXPECT_TRUE(reply.response.asEntries() == nullptr || reply.response.asEntries()->empty());
+  EXPECT_EQ(namesIn(folder()), std::set<std::string>{});
+  EXPECT_EQ(serverState(), "Started");
 }
 
-TEST_F(DaemonsOnPrivateBus, HostileRequestsGetAnswersNotCrashes) {
-  startVornd();
-  const char* kIface = "org.vorn.Manager1";
-  auto call = [&](const std::function<int(sd_bus_message*)>& append) {
-    return client.raw("org.vorn.Manager", "/org/vorn/Manager", kIface, "PerformCommand", append);
-  };
-  // Wrong signature: sd-bus refuses it before our code runs.
-  EXPECT_EQ(call([](sd_bus_message* m) { return sd_bus_message_append(m, "s", "x"); }).error,
-            "org.freedesktop.DBus.Error.InvalidArgs");
-  // A compression of a type outside the protocol reads as missing: tar.gz.
-  auto odd = call([](sd_bus_message* m) {
-    return sd_bus_message_append(m, "ssa{sv}", "x", "TraceDumpState", 2, "TraceAction", "s", "CollectBasebandLogs",
-                                 "TraceDumpStatePerformCompression", "i", 0);
-  });
-  ASSERT_EQ(odd.error, "");
-  EXPECT_EQ(odd.status, 0) << odd.description;
-  EXPECT_TRUE(fs::exists(folder() / ("log-bb-" + xpc::dyn_cast_or_default(odd.response.get("TimestampString"), "") +
-                                     ".tar.gz")));
-
-  struct Case {
-    const char* label;
-    std::string command;
-    object request;
-    int status;
-  } cases[] = {
-      {"unknown command", "Reboot", dict({}), vorn::status::kBadRequest},
-      {"huge unknown command", std::string(1 << 20, 'C'), dict({}), vorn::status::kBadRequest},
-      {"compression as text", "TraceDumpState",
-       dict({{"TraceAction", object::string("CollectTelephonyLogs")},
-             {"TraceDumpStatePerformCompression", object::string("0")}}),
-       vorn::status::kBadRequest},
-      {"action nested in a dictionary", "TraceDumpState",
-       dict({{"TraceAction", dict({{"TraceAction", object::string("CollectTelephonyLogs")}})}}),
-       vorn::status::kBadRequest},
-      {"huge reason", "TraceDumpState", telRequest(2, std::string(4 << 20, 'r')), 0},
-  };
-  for (const auto& c : cases) {
-    auto reply = client.perform(c.command, c.request);
-    ASSERT_EQ(reply.error, "") << c.label;
-    EXPECT_EQ(reply.status, c.status) << c.label << ": " << reply.description.substr(0, 200);
-  }
-  EXPECT_EQ(client.hello().error, "");
-  EXPECT_TRUE(vornd.running());
-  EXPECT_FALSE(vornd.waitExit(0ms).has_value());
-}
+INSTANTIATE_TEST_SUITE_P(
+    Daemons, FailedCollection,
+    ::testing::Values(
+        Failure{"UnreadableSource", "var/log/vorn", "a file where a folder belongs", {VORND_PATH}},
+        // A file-size limit fails writes the way a full disk does.
+        Failure{"NoRoom", "var/lib/vorn/modem/ram.bin", std::string(1 << 20, 'x'),
+                {"/bin/sh", "-c", "ulimit -f 256 && exec \"$0\" \"$@\"", VORND_PATH}}),
+    [](const auto& info) { return std::string(info.param.label); });
