@@ -4,6 +4,7 @@
 #include <systemd/sd-bus.h>
 
 #include <chrono>
+#include <condition_variable>
 #include <cstdint>
 #include <deque>
 #include <functional>
@@ -13,6 +14,8 @@
 #include <thread>
 
 #include "platform/linux/bus_message.h"
+#include "platform/result.h"
+#include "platform/xpc.h"
 
 /// One connection to the system bus, owned by one I/O thread. sd_bus objects
 /// are not thread-safe, so every use of the connection happens on that thread;
@@ -49,6 +52,33 @@ using ConnectHook = std::function<void(sd_bus*)>;
 /// for tests only, so that a call that never gets an answer fails in a second
 /// rather than in 25 s or 15 minutes; the tool itself never sets it.
 std::chrono::microseconds callTimeout(std::chrono::microseconds wanted);
+
+/// Where a synchronous call's outcome meets the thread that waits for it:
+/// the handler delivers on the I/O thread, the caller waits. The call's own
+/// timeout bounds the wait, since every handler runs exactly once.
+class SyncReply {
+ public:
+  void deliver(TelephonyXPC::Result result, xpc::object response) {
+    std::lock_guard lock(mutex_);
+    result_ = std::move(result);
+    response_ = std::move(response);
+    done_ = true;
+    delivered_.notify_all();
+  }
+  TelephonyXPC::Result wait(xpc::object& response) {
+    std::unique_lock lock(mutex_);
+    delivered_.wait(lock, [&] { return done_; });
+    response = response_;
+    return result_;
+  }
+
+ private:
+  std::mutex mutex_;
+  std::condition_variable delivered_;
+  bool done_ = false;
+  TelephonyXPC::Result result_;
+  xpc::object response_;
+};
 
 class BusLink {
  public:

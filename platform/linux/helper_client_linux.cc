@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: MIT
 // vorn::HelperClient over sd-bus.
-#include <condition_variable>
 #include <mutex>
 
 #include "platform/helper_client.h"
@@ -21,14 +20,7 @@ class BusHelperClient final : public HelperClient {
 
   TelephonyXPC::Result perform(helper::TaskID task, const char* command, xpc::dict request,
                                xpc::dict& response) override {
-    struct Waiter {
-      std::mutex mutex;
-      std::condition_variable cv;
-      bool done = false;
-      TelephonyXPC::Result result;
-      xpc::object response;
-    };
-    auto waiter = std::make_shared<Waiter>();
+    auto reply = std::make_shared<bus::SyncReply>();
     auto args = [client = clientName_, task, cmd = std::string(command ? command : ""),
                  body = request.obj()](sd_bus_message* m) {
       return sd_bus_message_append(m, "sus", client.c_str(), std::uint32_t(task), cmd.c_str()) >=
@@ -36,23 +28,19 @@ class BusHelperClient final : public HelperClient {
              bus::appendDictionary(m, body);
     };
     link_.call(kHelperPerform, std::move(args), bus::callTimeout(15min),
-               [waiter](const bus::CallOutcome& outcome) {
+               [reply](const bus::CallOutcome& outcome) {
                  TelephonyXPC::Result result{outcome.status, outcome.description};
                  xpc::object answer;
                  if (outcome.status == 0 &&
                      !bus::readResultReply(outcome.message, result.status, result.description,
                                            answer))
                    result = {status::kMalformedReply, "reply has an unexpected signature"};
-                 std::lock_guard lock(waiter->mutex);
-                 waiter->result = std::move(result);
-                 waiter->response = std::move(answer);
-                 waiter->done = true;
-                 waiter->cv.notify_all();
+                 reply->deliver(std::move(result), std::move(answer));
                });
-    std::unique_lock lock(waiter->mutex);
-    waiter->cv.wait(lock, [&] { return waiter->done; });
-    response = xpc::dict(waiter->response);
-    return waiter->result;
+    xpc::object answer;
+    auto result = reply->wait(answer);
+    response = xpc::dict(answer);
+    return result;
   }
 
  private:

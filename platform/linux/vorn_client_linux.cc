@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: MIT
 // vorn::client over sd-bus: one Manager, one connection, one I/O thread;
 // events and asynchronous completions are handed to the Manager's queue.
-#include <condition_variable>
 #include <cstdlib>
 #include <map>
 #include <mutex>
@@ -131,26 +130,11 @@ class BusManager final : public Manager {
 
   TelephonyXPC::Result performCommand(const std::string& command, const xpc::object& request,
                                       xpc::object& response) override {
-    struct Waiter {
-      std::mutex mutex;
-      std::condition_variable cv;
-      bool done = false;
-      TelephonyXPC::Result result;
-      xpc::object response;
-    };
-    auto waiter = std::make_shared<Waiter>();
-    submit(command, request, [waiter](TelephonyXPC::Result result, xpc::object answer) {
-      std::lock_guard lock(waiter->mutex);
-      waiter->result = std::move(result);
-      waiter->response = std::move(answer);
-      waiter->done = true;
-      waiter->cv.notify_all();
+    auto reply = std::make_shared<bus::SyncReply>();
+    submit(command, request, [reply](TelephonyXPC::Result result, xpc::object answer) {
+      reply->deliver(std::move(result), std::move(answer));
     });
-    // The bus's own call timeout bounds this wait: the handler always runs.
-    std::unique_lock lock(waiter->mutex);
-    waiter->cv.wait(lock, [&] { return waiter->done; });
-    response = waiter->response;
-    return waiter->result;
+    return reply->wait(response);
   }
 
   void performCommand(const std::string& command, Completion completion,
