@@ -1,26 +1,19 @@
 // SPDX-License-Identifier: MIT
-// Makes one call through the client library and prints its status: the tests
-// run it as another user to meet the bus policy.
+// Makes one call through the client library ("manager" or "helper") and prints
+// its status: the tests run it as another user to meet the bus policy.
 #include <cstdio>
-#include <cstring>
+#include <string>
 
 #include "platform/helper_client.h"
 #include "platform/vorn_client.h"
 
 int main(int argc, char** argv) {
-  bool helper = argc > 1 && std::strcmp(argv[1], "helper") == 0;
-  TelephonyXPC::Result result;
-  if (helper) {
-    auto client = vorn::HelperClient::create("probe", nullptr);
-    xpc::dict response;
-    result = client->perform(vorn::helper::kTaskDiagsnapStatus, vorn::helper::kCommandDiagsnapStatus,
-                             xpc::dict(), response);
-  } else {
-    auto manager = vorn::client::CreateManager("probe", dispatch::queue("probe.queue"));
-    xpc::object response;
-    result = vorn::client::PerformCommand(manager, vorn::kCommandTraceDumpState,
-                                          xpc::object::dictionary({}), response);
-  }
+  xpc::object response;
+  xpc::dict helperResponse;
+  auto result = argc > 1 && std::string(argv[1]) == "helper"
+                    ? vorn::HelperClient::create("probe", nullptr)
+                          ->perform(vorn::helper::kTaskDiagsnapStatus, "DiagsnapStatus", xpc::dict(), helperResponse)
+                    : vorn::client::PerformCommand(vorn::client::CreateManager("probe", dispatch::queue("probe.queue")),
+                                                   "TraceDumpState", xpc::object::dictionary({}), response);
   std::printf("%d\n", result.status);
-  return 0;
 }

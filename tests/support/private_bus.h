@@ -4,6 +4,7 @@
 #include <sys/types.h>
 
 #include <chrono>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -11,34 +12,7 @@
 /// processes with bounded waits.
 namespace vorn::test {
 
-/// A private dbus-daemon with the project's bus policy, started for one test
-/// and exported as the system bus (DBUS_SYSTEM_BUS_ADDRESS). Killed, and the
-/// previous address restored, on destruction.
-class PrivateBus {
- public:
-  PrivateBus();
-  ~PrivateBus();
-  PrivateBus(const PrivateBus&) = delete;
-  PrivateBus& operator=(const PrivateBus&) = delete;
-
-  /// False when the daemon could not be started; `error()` says why.
-  bool ok() const { return pid_ > 0; }
-  const std::string& error() const { return error_; }
-  const std::string& address() const { return address_; }
-  /// A scratch folder that lives as long as the bus.
-  const std::string& directory() const { return directory_; }
-
- private:
-  pid_t pid_ = -1;
-  std::string directory_;
-  std::string address_;
-  std::string error_;
-  std::string savedAddress_;
-  bool hadAddress_ = false;
-};
-
-/// A child process killed (SIGTERM, then SIGKILL after a grace period) and
-/// reaped on destruction.
+/// A child process killed (SIGKILL) and reaped on destruction.
 class ChildProcess {
  public:
   struct Options {
@@ -52,13 +26,11 @@ class ChildProcess {
     std::string stdoutPath;
   };
 
-  ChildProcess() = default;
   explicit ChildProcess(const Options& options);
-  ~ChildProcess();
-  ChildProcess(ChildProcess&& other) noexcept;
-  ChildProcess& operator=(ChildProcess&& other) noexcept;
+  ~ChildProcess() { kill(); }
+  ChildProcess(const ChildProcess&) = delete;
+  ChildProcess& operator=(const ChildProcess&) = delete;
 
-  pid_t pid() const { return pid_; }
   bool running() const { return pid_ > 0; }
   /// Waits at most `limit` for the child to exit; its exit code, or -1 when it
   /// did not exit in time or died of a signal.
@@ -68,14 +40,30 @@ class ChildProcess {
 
  private:
   pid_t pid_ = -1;
-  int status_ = -1;
+};
+
+/// A private dbus-daemon with the project's bus policy, started for one test
+/// and exported as the system bus (DBUS_SYSTEM_BUS_ADDRESS). Killed, and the
+/// variable unset, on destruction.
+class PrivateBus {
+ public:
+  PrivateBus();  // not copyable: it owns the daemon
+  ~PrivateBus();
+
+  /// False when the daemon could not be started; `error()` says why.
+  bool ok() const { return daemon_.has_value(); }
+  const std::string& error() const { return error_; }
+  /// A scratch folder that lives as long as the bus.
+  const std::string& directory() const { return directory_; }
+
+ private:
+  std::string directory_;
+  std::optional<ChildProcess> daemon_;
+  std::string error_;
 };
 
 /// Waits at most `limit` until `name` has an owner on the system bus; true
 /// when it has one.
 bool waitForBusName(const std::string& name, std::chrono::milliseconds limit);
-
-/// True when the process runs as root (owning the project's names needs it).
-bool isRoot();
 
 }  // namespace vorn::test
