@@ -37,14 +37,6 @@ TEST_F(LogdumpPermission, HelpListsTheFourHandlers) {
             "\t              cd  -  <sub-command>\n\t            help\n\t            back\n\t            quit\n\n");
 }
 
-TEST_F(LogdumpPermission, OslogWithTooFewWordsFails) {
-  for (const std::list<std::string>& typed : {std::list<std::string>{}, std::list<std::string>{"600"}}) {
-    auto r = run("oslog", typed);
-    EXPECT_FALSE(r.result);
-    EXPECT_EQ(r.out, "os log collection: Failed\n");
-  }
-}
-
 TEST(TraceNames, SuffixesFollowTheVendorSeenFirst) {
   auto device = std::make_shared<FakeDevice>();
   device->vendorCode = 2;

@@ -63,13 +63,4 @@ TEST(TraceMode, NamedModesAndWholeIntegers) {
   }
 }
 
-TEST(ArchivePath, FolderPrefixTimestampAndEnding) {
-  const std::string folder = "/var/wireless/Library/Logs/CrashReporter/Baseband/";
-  EXPECT_EQ(getLogArchivePath("T", TarGz, "-*"), folder + "log-bb-T.tar.gz");
-  EXPECT_EQ(getLogArchivePath("T", Tar, "-*"), folder + "log-bb-T.tar");
-  EXPECT_EQ(getLogArchivePath("T", None, "-*"), folder + "log-bb-T-*");
-  EXPECT_EQ(getLogArchivePath("T", static_cast<CompressionMode>(7), "-cd"), folder + "log-bb-T-cd");
-  EXPECT_EQ(getLogArchivePath("", TarGz, "-*"), folder + "log-bb-.tar.gz");
-}
-
 }  // namespace

@@ -24,15 +24,6 @@ TEST_F(Startup, WatchProductsAreExactlyTheListedCodes) {
   }
 }
 
-TEST_F(Startup, InternalOrCarrierAsksCarrierOnlyWhenNotInternal) {
-  device->buildKind = platform::BuildKind::internal;
-  EXPECT_TRUE(config::build::internal_or_carrier());
-  device->buildKind = platform::BuildKind::carrier;
-  EXPECT_TRUE(config::build::internal_or_carrier());
-  device->buildKind = platform::BuildKind::customer;
-  EXPECT_FALSE(config::build::internal_or_carrier());
-}
-
 TEST_F(Startup, ChecksRadioThenDaemons) {
   const std::string noRadio = "'vorntool' is not supported on this product.\n";
   const std::string noDaemon =
