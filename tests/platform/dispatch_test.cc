@@ -79,20 +79,4 @@ TEST(GroupMembership, EntersPerCopyAndLeavesPerDestruction) {
   EXPECT_TRUE(g.wait(0ns));
 }
 
-TEST(DispatchBlock, CopyingCopiesCapturedMemberships) {
-  dispatch::group g;
-  dispatch::block<int(int)> empty;
-  EXPECT_FALSE(empty);
-  {
-    dispatch::block<int(int)> b = [m = GroupMembership(g)](int x) { return x + 1; };
-    ASSERT_TRUE(b);
-    EXPECT_EQ(b(1), 2);
-    auto copy = b;
-    b = nullptr;
-    EXPECT_FALSE(g.wait(0ns));  // the copy's own membership
-    EXPECT_EQ(copy(41), 42);
-  }
-  EXPECT_TRUE(g.wait(0ns));
-}
-
 }  // namespace

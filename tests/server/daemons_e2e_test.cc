@@ -1,19 +1,14 @@
 // SPDX-License-Identifier: MIT
 // vornd and vorn-helper, built, on a private bus with the project's policy.
-#include <archive.h>
-#include <archive_entry.h>
 #include <gtest/gtest.h>
 #include <unistd.h>
 
-#include <atomic>
 #include <filesystem>
 #include <fstream>
 #include <functional>
-#include <map>
 #include <list>
 #include <optional>
 #include <set>
-#include <thread>
 
 #include "platform/vorn_constants.h"
 #include "server/common/bus_handles.h"
@@ -48,32 +43,6 @@ std::set<std::string> namesIn(const fs::path& dir) {
   std::set<std::string> names;
   if (fs::exists(dir)) for (const auto& e : fs::directory_iterator(dir)) names.insert(e.path().filename().string());
   return names;
-}
-
-/// An archive read back with libarchive: entry name -> contents, and the
-/// compression filter found; `readable` once it was read to the end.
-struct Listing {
-  bool readable = false;
-  int filter = ARCHIVE_FILTER_NONE;
-  std::map<std::string, std::string> entries;
-};
-
-Listing listArchive(const fs::path& path) {
-  Listing out;
-  archive* a = archive_read_new();
-  archive_read_support_filter_all(a);
-  archive_read_support_format_all(a);
-  archive_entry* entry = nullptr;
-  int r = archive_read_open_filename(a, path.c_str(), 10240);
-  while (r == ARCHIVE_OK && (r = archive_read_next_header(a, &entry)) == ARCHIVE_OK) {
-    std::string& data = out.entries[archive_entry_pathname(entry)];
-    char buf[8192];
-    for (la_ssize_t n = 0; (n = archive_read_data(a, buf, sizeof buf)) > 0;) data.append(buf, size_t(n));
-  }
-  out.readable = r == ARCHIVE_EOF;
-  out.filter = archive_filter_code(a, 0);
-  archive_read_free(a);
-  return out;
 }
 
 /// Calls org.vorn.<service> on a connection of its own; `append` writes the
@@ -156,66 +125,6 @@ class Daemons : public ::testing::Test {
   std::list<vorn::test::ChildProcess> daemons;  // ended before the bus goes
 };
 
-TEST_F(Daemons, HelloSaysStartingUntilTheDelayedStart) {
-  start({VORND_PATH, "--start-delay-ms", "1500"});
-  EXPECT_EQ(serverState(), "Starting");
-  auto deadline = std::chrono::steady_clock::now() + 10s;
-  while (serverState() != "Started" && std::chrono::steady_clock::now() < deadline) std::this_thread::sleep_for(50ms);
-  EXPECT_EQ(serverState(), "Started");
-}
-
-TEST_F(Daemons, AnswersTracePropertiesAndRefusesTheUnknown) {
-  write("var/lib/vorn/trace.properties", "SystemLogs.Mode=3\n");
-  start({VORND_PATH});
-  auto property = [](const char* trace, const char* name) {
-    return dict({{"TraceName", object::string(trace)}, {"TracePropertyName", object::string(name)}});
-  };
-  struct Case {
-    std::string command;
-    object request;
-    int status;
-    const char* value;
-  } cases[] = {
-      {"GetTraceProperty", property("SystemLogs", "Mode"), 0, "3"},
-      {"GetTraceProperty", property("Baseband", "Enabled"), 0, "1"},  // a default the file does not set
-      {"GetTraceProperty", property("Baseband", "Nope"), kBadRequest, ""},
-      {"GetTraceProperty", dict({{"TraceName", object::string("Baseband")}}), kBadRequest, ""},
-      {"TraceDumpState", dict({{"TraceAction", object::string("CollectEverything")}}), kBadRequest, ""},
-      {"Reboot", dict({}), kBadRequest, ""},
-  };
-  for (const auto& c : cases) {
-    auto reply = perform(c.command, c.request);
-    EXPECT_EQ(reply.status, c.status) << c.command << reply.error;
-    EXPECT_EQ(text(reply.response, "TracePropertyValue"), c.value) << c.command;
-  }
-  EXPECT_TRUE(namesIn(folder()).empty());
-}
-
-TEST_F(Daemons, CompressedCollectionIsAnArchiveOfManifestAndLogs) {
-  start({VORND_PATH});
-  struct Case {
-    std::optional<int> compression;
-    const char* extension;
-    int filter;
-  } cases[] = {{std::nullopt, ".tar.gz", ARCHIVE_FILTER_GZIP}, {2, ".tar", ARCHIVE_FILTER_NONE}};
-  std::set<std::string> made;
-  for (const auto& c : cases) {
-    auto reply = perform("TraceDumpState", collect("CollectTelephonyLogs", c.compression));
-    ASSERT_EQ(reply.status, 0) << reply.error;
-    const std::string ts = text(reply.response, "TimestampString");
-    made.insert("log-bb-" + ts + c.extension);
-    auto listing = listArchive(folder() / ("log-bb-" + ts + c.extension));
-    ASSERT_TRUE(listing.readable) << c.extension;
-    EXPECT_EQ(listing.filter, c.filter);
-    const std::string dir = "log-bb-" + ts + "-tel/";
-    EXPECT_EQ(listing.entries[dir + "vorn/telhub.log"], "telhub up\n");
-    EXPECT_EQ(listing.entries[dir + "ZelmarBasebandManager/bbmgr.log"], "bb up\n");
-    EXPECT_NE(listing.entries[dir + "manifest.txt"].find("reason: e2e\n"), std::string::npos);
-    EXPECT_EQ(listing.entries.count(dir + "coredump/ram.bin"), 0u);
-  }
-  EXPECT_EQ(namesIn(folder()), made);  // the directories were removed once packed
-}
-
 TEST_F(Daemons, NocompressLeavesDirectoriesTheHelperReportsTheNewestOf) {
   start({VORND_PATH});
   start({VORN_HELPER_PATH}, [] { return diagsnapStatus(); });
@@ -238,33 +147,6 @@ TEST_F(Daemons, NocompressLeavesDirectoriesTheHelperReportsTheNewestOf) {
   EXPECT_EQ(text(found.response, "TimestampString"), newest);
   EXPECT_EQ(diagsnapStatus(3).status, kBadRequest);
   EXPECT_EQ(diagsnapStatus(4, "Other").status, kBadRequest);
-}
-
-TEST_F(Daemons, ConcurrentRequestsEachGetTheirOwnCollection) {
-  std::string data(24 << 20, '\0');  // incompressible: each collection takes a noticeable time
-  std::ifstream("/dev/urandom", std::ios::binary).read(data.data(), std::streamsize(data.size()));
-  write("var/log/vorn/big.bin", data);
-  start({VORND_PATH});
-  Reply replies[3];
-  std::atomic<int> finished{0};
-  std::vector<std::thread> clients;
-  for (auto& r : replies) {
-    clients.emplace_back([&] {
-      r = perform("TraceDumpState", collect("CollectTelephonyLogs", 1));
-      ++finished;
-    });
-  }
-  std::this_thread::sleep_for(100ms);
-  EXPECT_EQ(serverState(), "Started");
-  EXPECT_LT(finished, 3) << "every collection ended before Hello was answered";
-  for (auto& t : clients) t.join();
-  std::set<std::string> archives;
-  for (const auto& r : replies) {
-    EXPECT_EQ(r.status, 0) << r.error;
-    archives.insert("log-bb-" + text(r.response, "TimestampString") + ".tar.gz");
-  }
-  EXPECT_EQ(namesIn(folder()), archives);
-  EXPECT_EQ(archives.size(), 3u);
 }
 
 // A collection that fails answers 0xE0200002 and leaves nothing behind.
