@@ -2,9 +2,8 @@
 #include "server/common/device_facts.h"
 
 #include <filesystem>
-#include <fstream>
-#include <sstream>
 
+#include "platform/linux/text_lines.h"
 #include "server/common/text_util.h"
 
 namespace vorn::server {
@@ -14,30 +13,20 @@ constexpr int kVendorWithTraceSuffix = 2;
 }
 
 DeviceFacts parseDeviceFacts(std::string_view text) {
+  // The same reading of device.conf as the client library's.
   DeviceFacts facts;
-  for (std::string_view line : splitLines(text)) {
-    auto hash = line.find('#');
-    if (hash != std::string_view::npos) line = line.substr(0, hash);
-    auto eq = line.find('=');
-    if (eq == std::string_view::npos) continue;
-    std::string_view key = trim(line.substr(0, eq));
-    std::string_view value = trim(line.substr(eq + 1));
-    if (key.empty()) continue;
+  bus::forEachSetting(text, [&](std::string_view key, std::string_view value) {
     facts.entries.emplace_back(std::string(key), std::string(value));
     if (key == "vendor") {
       long v = 0;
       facts.vendor = parseCount(value, &v) ? static_cast<int>(v) : 0;
     }
-  }
+  });
   return facts;
 }
 
 DeviceFacts loadDeviceFacts(const std::string& root) {
-  std::ifstream in(std::filesystem::path(root) / "etc/vorn/device.conf", std::ios::binary);
-  if (!in) return {};
-  std::ostringstream text;
-  text << in.rdbuf();
-  return parseDeviceFacts(text.str());
+  return parseDeviceFacts(bus::readSmallFile((std::filesystem::path(root) / "etc/vorn/device.conf").string()));
 }
 
 std::string basebandTraceSuffix(int vendor) {
