@@ -5,7 +5,6 @@
 #include <iterator>
 
 namespace vorn::bus {
-namespace {
 
 std::string_view trim(std::string_view s) {
   const char* blanks = " \t\r\f\v";
@@ -14,8 +13,6 @@ std::string_view trim(std::string_view s) {
   auto last = s.find_last_not_of(blanks);
   return s.substr(first, last - first + 1);
 }
-
-}  // namespace
 
 void forEachSetting(std::string_view text,
                     const std::function<void(std::string_view, std::string_view)>& setting) {

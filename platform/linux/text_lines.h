@@ -7,6 +7,9 @@
 
 namespace vorn::bus {
 
+/// Without leading and trailing blanks (space, tab, CR, FF, VT).
+std::string_view trim(std::string_view s);
+
 /// Calls `setting` for each `key=value` line of `text`: '#' starts a comment,
 /// blanks around keys and values are dropped, and lines without '=' or with
 /// an empty key are skipped.

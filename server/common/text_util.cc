@@ -6,14 +6,6 @@
 
 namespace vorn::server {
 
-std::string_view trim(std::string_view s) {
-  const char* blanks = " \t\r";
-  auto first = s.find_first_not_of(blanks);
-  if (first == std::string_view::npos) return {};
-  auto last = s.find_last_not_of(blanks);
-  return s.substr(first, last - first + 1);
-}
-
 std::vector<std::string_view> splitLines(std::string_view text) {
   std::vector<std::string_view> lines;
   while (!text.empty()) {

@@ -5,11 +5,12 @@
 #include <string_view>
 #include <vector>
 
+#include "platform/linux/text_lines.h"
+
 /// Small text helpers shared by the daemons' file readers.
 namespace vorn::server {
 
-/// Without leading and trailing spaces, tabs and carriage returns.
-std::string_view trim(std::string_view s);
+using bus::trim;
 
 /// The lines of `text`, without their '\n'; a final line without one counts.
 std::vector<std::string_view> splitLines(std::string_view text);

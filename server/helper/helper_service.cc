@@ -4,7 +4,7 @@
 #include <exception>
 
 #include "platform/vorn_constants.h"
-#include "server/common/bus_values.h"
+#include "platform/linux/bus_message.h"
 #include "server/common/collector.h"
 #include "server/common/device_facts.h"
 #include "server/common/snapshot_scan.h"
@@ -65,7 +65,7 @@ int HelperService::perform(sd_bus_message* m) {
   int r = sd_bus_message_read(m, "sus", &client, &task, &command);
   if (r < 0) return r;
   xpc::object request;
-  if (!readDictionary(m, &request)) return -EBADMSG;
+  if (!bus::readDictionary(m, request)) return -EBADMSG;
 
   HelperAnswer answer = options_.fail ? HelperAnswer{*options_.fail, "failing on purpose", {}}
                                       : performHelperTask(options_.root, task, command, request);
@@ -73,7 +73,7 @@ int HelperService::perform(sd_bus_message* m) {
   if ((r = sd_bus_message_new_method_return(m, &raw)) < 0) return r;
   MessagePtr reply(raw);
   if ((r = sd_bus_message_append(reply.get(), "is", answer.status, answer.description.c_str())) < 0) return r;
-  if (!appendDictionary(reply.get(), answer.response)) return -ENOMEM;
+  if (!bus::appendDictionary(reply.get(), answer.response)) return -ENOMEM;
   loop_.sendReply(std::move(reply), options_.replyDelayMs);
   return 1;
 }

@@ -6,7 +6,7 @@
 #include <exception>
 
 #include "platform/vorn_constants.h"
-#include "server/common/bus_values.h"
+#include "platform/linux/bus_message.h"
 
 namespace vorn::server {
 
@@ -77,7 +77,7 @@ void ManagerService::announce(const std::string& state) {
   if (sd_bus_message_new_signal(loop_.bus(), &raw, kManagerObjectPath, kManagerInterface, "Event") < 0) return;
   MessagePtr signal(raw);
   if (sd_bus_message_append_basic(signal.get(), 's', kEventServerStateChange) < 0) return;
-  if (!appendDictionary(signal.get(), stateDict(state))) return;
+  if (!bus::appendDictionary(signal.get(), stateDict(state))) return;
   sd_bus_send(loop_.bus(), signal.get(), nullptr);
   // Watchers (the sandbox, tests) learn the state from this line as well.
   fprintf(stderr, "vornd: state %s\n", state.c_str());
@@ -102,7 +102,7 @@ int ManagerService::hello(sd_bus_message* m, sd_bus_error*) {
   sd_bus_message* raw = nullptr;
   if ((r = sd_bus_message_new_method_return(m, &raw)) < 0) return r;
   MessagePtr answer(raw);
-  if (!appendDictionary(answer.get(), stateDict(state_))) return -ENOMEM;
+  if (!bus::appendDictionary(answer.get(), stateDict(state_))) return -ENOMEM;
   loop_.sendReply(std::move(answer), options_.replyDelayMs);
   return 1;
 }
@@ -114,7 +114,7 @@ int ManagerService::performCommand(sd_bus_message* m, sd_bus_error*) {
   if (r < 0) return r;
   std::string name = command;
   xpc::object request;
-  if (!readDictionary(m, &request)) return -EBADMSG;
+  if (!bus::readDictionary(m, request)) return -EBADMSG;
 
   if (misbehave(m, name)) return 1;
   if (name == kCommandGetTraceProperty) {
@@ -170,13 +170,13 @@ void ManagerService::reply(sd_bus_message* call, const Answer& answer) {
   if (sd_bus_message_new_method_return(call, &raw) < 0) return;
   MessagePtr msg(raw);
   bool ok = sd_bus_message_append(msg.get(), "is", answer.status, answer.description.c_str()) >= 0 &&
-            appendDictionary(msg.get(), answer.response);
+            bus::appendDictionary(msg.get(), answer.response);
   if (!ok) {
     // A description that is not valid UTF-8 cannot travel; answer without it.
     if (sd_bus_message_new_method_return(call, &raw) < 0) return;
     msg.reset(raw);
     if (sd_bus_message_append(msg.get(), "is", answer.status, "") < 0) return;
-    if (!appendDictionary(msg.get(), xpc::object())) return;
+    if (!bus::appendDictionary(msg.get(), xpc::object())) return;
   }
   loop_.sendReply(std::move(msg), options_.replyDelayMs);
 }

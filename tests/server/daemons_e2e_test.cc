@@ -12,7 +12,7 @@
 
 #include "platform/vorn_constants.h"
 #include "server/common/bus_handles.h"
-#include "server/common/bus_values.h"
+#include "platform/linux/bus_message.h"
 #include "tests/support/private_bus.h"
 
 namespace fs = std::filesystem;
@@ -65,7 +65,7 @@ Reply call(const std::string& service, const char* member, const std::function<i
   const char* description = nullptr;  // (isa{sv}) for commands, (a{sv}) for Hello
   bool isStatus = out.error.empty() && sd_bus_message_get_signature(r, 1)[0] == 'i';
   if (out.error.empty() && ((isStatus && sd_bus_message_read(r, "is", &out.status, &description) < 0) ||
-                            !vorn::server::readDictionary(r, &out.response))) {
+                            !vorn::bus::readDictionary(r, out.response))) {
     out = {"test.BadReply", -1, {}};
   }
   return out;
@@ -77,14 +77,14 @@ std::string serverState() { return text(hello().response, "ServerState"); }
 Reply perform(const std::string& command, const object& request) {
   return call("Manager", "PerformCommand", [&](sd_bus_message* m) {
     int r = sd_bus_message_append(m, "ss", "test", command.c_str());
-    return r < 0 ? r : vorn::server::appendDictionary(m, request) ? 0 : -EINVAL;
+    return r < 0 ? r : vorn::bus::appendDictionary(m, request) ? 0 : -EINVAL;
   });
 }
 
 Reply diagsnapStatus(std::uint32_t task = 4, const char* command = "DiagsnapStatus") {
   return call("Helper", "Perform", [&](sd_bus_message* m) {
     int r = sd_bus_message_append(m, "sus", "test", task, command);
-    return r < 0 ? r : vorn::server::appendDictionary(m, dict({{"Timeout", object::int64(1500)}})) ? 0 : -EINVAL;
+    return r < 0 ? r : vorn::bus::appendDictionary(m, dict({{"Timeout", object::int64(1500)}})) ? 0 : -EINVAL;
   });
 }
 
