@@ -7,7 +7,7 @@
 #include "logdump/logdump_options.h"
 #include "logdump/trace_names.h"
 #include "platform/helper_client.h"
-#include "tool/config.h"
+#include "toolbase/config.h"
 
 namespace {
 

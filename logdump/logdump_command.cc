@@ -8,7 +8,7 @@
 #include "logdump/oslog_command.h"
 #include "logdump/telephony_collection.h"
 #include "logdump/trace_names.h"
-#include "tool/server_state.h"
+#include "toolbase/server_state.h"
 
 std::shared_ptr<LogdumpCommand> LogdumpCommand::create(std::string name,
                                                        std::weak_ptr<CommandBase> parent,

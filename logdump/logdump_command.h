@@ -4,7 +4,7 @@
 #include <memory>
 #include <string>
 
-#include "tool/vorn_command_base.h"
+#include "toolbase/vorn_command_base.h"
 
 /// The "logdump" node: the "tel", "core", "bb" and "oslog" collections.
 /// Everything but "bb" needs a running server.

@@ -8,7 +8,7 @@
 #include <string>
 
 #include "platform/device.h"
-#include "tool/config.h"
+#include "toolbase/config.h"
 #include "tool/vorn_shell.h"
 
 bool passesStartupChecks() {

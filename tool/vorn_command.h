@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: MIT
 #pragma once
 
-#include "tool/vorn_command_base.h"
+#include "toolbase/vorn_command_base.h"
 
 /// The root of the tool's tree, named after the program; its only child is
 /// "logdump".

@@ -5,7 +5,7 @@
 
 #include "platform/device.h"
 #include "platform/vorn_client.h"
-#include "tool/server_state.h"
+#include "toolbase/server_state.h"
 #include "tool/vorn_command.h"
 
 namespace {

@@ -11,7 +11,7 @@
 #include "../framework/stdio_capture.h"
 #include "logdump/logdump_command.h"
 #include "logdump/trace_names.h"
-#include "tool/server_state.h"
+#include "toolbase/server_state.h"
 
 /// A logdump command wired to a scripted server, device and helper service.
 class LogdumpTest : public testing::Test {

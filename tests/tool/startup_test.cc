@@ -3,7 +3,7 @@
 
 #include "../fakes/fake_device.h"
 #include "../framework/stdio_capture.h"
-#include "tool/config.h"
+#include "toolbase/config.h"
 #include "tool/startup.h"
 
 namespace {

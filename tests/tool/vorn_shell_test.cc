@@ -7,8 +7,8 @@
 #include "../fakes/fake_device.h"
 #include "../fakes/fake_manager.h"
 #include "platform/device.h"
-#include "tool/server_state.h"
-#include "tool/vorn_command_base.h"
+#include "toolbase/server_state.h"
+#include "toolbase/vorn_command_base.h"
 #include "tool/vorn_shell.h"
 
 namespace {

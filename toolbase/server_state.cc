@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-#include "tool/server_state.h"
+#include "toolbase/server_state.h"
 
 std::atomic<bool> gServerRunning{false};
 

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-#include "tool/config.h"
+#include "toolbase/config.h"
 
 #include <cstdint>
 
