@@ -5,20 +5,14 @@
 
 namespace vorn::trace {
 
-namespace {
-constexpr int kVendorWithTraceNames = 2;
-}
-
 std::string getBasebandTraceDirSuffix() {
   // Function statics: built once, thread-safe, and asking the vendor only then.
-  static const std::string suffix =
-      TelephonyRadiosGetRadioVendor() == kVendorWithTraceNames ? "-bb-trace" : "-diag";
+  static const std::string suffix = basebandTraceDirSuffix(TelephonyRadiosGetRadioVendor());
   return suffix;
 }
 
 std::string getCoreDumpDirSuffix() {
-  static const std::string suffix =
-      TelephonyRadiosGetRadioVendor() == kVendorWithTraceNames ? "-coredump" : "-cd";
+  static const std::string suffix = coreDumpDirSuffix(TelephonyRadiosGetRadioVendor());
   return suffix;
 }
 

@@ -3,14 +3,13 @@
 
 #include <string>
 
-/// Folders, names and messages of collected logs.
-namespace vorn::trace {
-inline constexpr const char* kScratchFolder = "/var/wireless/Library/Logs/ZelmarBasebandManager/";
-inline constexpr const char* kSnapshotFolder = "/var/wireless/Library/Logs/CrashReporter/Baseband/";
-inline constexpr const char* kLogDirPrefix = "log-bb-";
-inline constexpr const char* kLogTarExtension = "tar";
-inline constexpr const char* kLogTarGzExtension = "tar.gz";
+#include "platform/protocol/protocol.h"
 
+/// Names of collected logs as the tool reports them. The folders, the
+/// prefix and the extensions are the protocol's (vorn::trace in
+/// platform/protocol/protocol.h); the suffixes here follow this device's
+/// radio vendor.
+namespace vorn::trace {
 /// "-bb-trace" for radio vendor 2, else "-diag"; fixed on first use.
 std::string getBasebandTraceDirSuffix();
 /// "-coredump" for radio vendor 2, else "-cd"; fixed on first use.

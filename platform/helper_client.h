@@ -5,7 +5,7 @@
 #include <memory>
 
 #include "platform/result.h"
-#include "platform/vorn_constants.h"
+#include "platform/protocol/protocol.h"
 #include "platform/xpc.h"
 
 namespace rilx {

@@ -4,6 +4,8 @@
 #include <cstdint>
 #include <string>
 
+#include "platform/protocol/protocol.h"
+
 namespace TelephonyXPC {
 
 /// Outcome of one request to the server or its helper service.
@@ -13,6 +15,3 @@ struct Result {
 };
 
 }  // namespace TelephonyXPC
-
-/// The server's name has no owner, or no bus can be reached.
-inline constexpr std::int32_t kResultServerNotRunning = static_cast<std::int32_t>(0xE020E001);

@@ -7,7 +7,7 @@
 
 #include "platform/dispatch.h"
 #include "platform/result.h"
-#include "platform/vorn_constants.h"
+#include "platform/protocol/protocol.h"
 #include "platform/xpc.h"
 
 /// The server's client library. `CreateManager` connects over D-Bus unless a

@@ -8,8 +8,9 @@
 
 #include <cstdlib>
 
+#include "platform/linux/bus_guard.h"
 #include "platform/result.h"
-#include "platform/vorn_constants.h"
+#include "platform/protocol/protocol.h"
 
 namespace vorn::bus {
 namespace {
@@ -29,18 +30,20 @@ struct PendingCall {
     h(outcome);
   }
 
-  static int onReply(sd_bus_message* reply, void* userdata, sd_bus_error*) {
-    auto* self = static_cast<PendingCall*>(userdata);
-    CallOutcome outcome;
-    if (sd_bus_message_is_method_error(reply, nullptr)) {
-      const sd_bus_error* e = sd_bus_message_get_error(reply);
-      outcome.status = statusForError(e ? e->name : nullptr);
-      outcome.description = e && e->message ? e->message : (e && e->name ? e->name : "");
-    } else {
-      outcome.message = reply;
-    }
-    self->finish(outcome);
-    return 1;
+  static int onReply(sd_bus_message* reply, void* userdata, sd_bus_error* error) {
+    return guarded(error, [&] {
+      auto* self = static_cast<PendingCall*>(userdata);
+      CallOutcome outcome;
+      if (sd_bus_message_is_method_error(reply, nullptr)) {
+        const sd_bus_error* e = sd_bus_message_get_error(reply);
+        outcome.status = statusForError(e ? e->name : nullptr);
+        outcome.description = e && e->message ? e->message : (e && e->name ? e->name : "");
+      } else {
+        outcome.message = reply;
+      }
+      self->finish(outcome);
+      return 1;
+    });
   }
 
   static void onDestroy(void* userdata) {

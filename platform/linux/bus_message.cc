@@ -4,7 +4,7 @@
 #include <cstring>
 #include <string_view>
 
-#include "platform/vorn_constants.h"
+#include "platform/protocol/protocol.h"
 #include "platform/result.h"
 
 namespace vorn::bus {

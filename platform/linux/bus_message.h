@@ -7,21 +7,12 @@
 #include <memory>
 #include <string>
 
+#include "platform/linux/bus_handles.h"
 #include "platform/xpc.h"
 
 /// Message objects on the wire: xpc::object <-> D-Bus `a{sv}`, and the status
 /// a D-Bus error stands for. No connection is needed beyond the message.
 namespace vorn::bus {
-
-struct MessageUnref {
-  void operator()(sd_bus_message* m) const { sd_bus_message_unref(m); }
-};
-using MessagePtr = std::unique_ptr<sd_bus_message, MessageUnref>;
-
-struct BusUnref {
-  void operator()(sd_bus* b) const { sd_bus_flush_close_unref(b); }
-};
-using BusPtr = std::unique_ptr<sd_bus, BusUnref>;
 
 /// Deeper containers than this are refused when sending and read as null when
 /// received; dbus-daemon itself allows at most 64 nested containers.

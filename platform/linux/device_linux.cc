@@ -5,13 +5,13 @@
 #include <errno.h>
 #include <unistd.h>
 
-#include <cstdlib>
 #include <cstring>
 #include <mutex>
 
 #include "platform/device.h"
 #include "platform/linux/device_conf.h"
 #include "platform/linux/text_lines.h"
+#include "platform/protocol/protocol.h"
 
 namespace platform {
 namespace {
@@ -72,10 +72,9 @@ class LinuxDevice final : public DeviceInfo {
 
  private:
   static DeviceFacts read() {
-    const char* root = std::getenv("VORN_ROOT");
-    std::string base = root && *root ? root : "";
-    while (!base.empty() && base.back() == '/') base.pop_back();
-    return parseDeviceConf(vorn::bus::readSmallFile(base + "/etc/vorn/device.conf", 64 * 1024));
+    using namespace vorn::protocol;
+    return parseDeviceConf(
+        vorn::bus::readSmallFile(underRoot(platformRoot(), kDeviceConfPath), 64 * 1024));
   }
 };
 

@@ -11,8 +11,8 @@ namespace {
 
 using namespace std::chrono_literals;
 
-constexpr bus::CallTarget kHelperPerform{"org.vorn.Helper", "/org/vorn/Helper",
-                                         "org.vorn.Helper1", "Perform"};
+constexpr bus::CallTarget kHelperPerform{protocol::kHelperBusName, protocol::kHelperObjectPath,
+                                         protocol::kHelperInterface, protocol::kPerformMethod};
 
 class BusHelperClient final : public HelperClient {
  public:

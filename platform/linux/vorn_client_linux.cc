@@ -1,14 +1,14 @@
 // SPDX-License-Identifier: MIT
 // vorn::client over sd-bus: one Manager, one connection, one I/O thread;
 // events and asynchronous completions are handed to the Manager's queue.
-#include <cstdlib>
 #include <map>
 #include <mutex>
 
+#include "platform/linux/bus_guard.h"
 #include "platform/linux/bus_link.h"
 #include "platform/linux/bus_message.h"
 #include "platform/linux/text_lines.h"
-#include "platform/linux/trace_properties.h"
+#include "platform/protocol/trace_properties.h"
 #include "platform/vorn_client.h"
 
 namespace vorn::client {
@@ -17,11 +17,10 @@ namespace {
 using namespace std::chrono_literals;
 using Done = std::function<void(TelephonyXPC::Result, xpc::object)>;
 
-constexpr const char* kManagerName = "org.vorn.Manager";
-constexpr bus::CallTarget kPerform{kManagerName, "/org/vorn/Manager", "org.vorn.Manager1",
-                                   "PerformCommand"};
-constexpr bus::CallTarget kHello{kManagerName, "/org/vorn/Manager", "org.vorn.Manager1",
-                                 "Hello"};
+constexpr bus::CallTarget kPerform{protocol::kManagerBusName, protocol::kManagerObjectPath,
+                                   protocol::kManagerInterface, protocol::kPerformCommandMethod};
+constexpr bus::CallTarget kHello{protocol::kManagerBusName, protocol::kManagerObjectPath,
+                                 protocol::kManagerInterface, protocol::kHelloMethod};
 
 std::chrono::microseconds timeoutFor(const std::string& command) {
   // A collection can take minutes; everything else answers at once.
@@ -57,13 +56,16 @@ struct Events : std::enable_shared_from_this<Events> {
     });
   }
 
-  static int onSignal(sd_bus_message* m, void* userdata, sd_bus_error*) {
-    if (sd_bus_message_has_signature(m, "sa{sv}") <= 0) return 0;
-    const char* name = nullptr;
-    xpc::object payload;
-    if (sd_bus_message_read_basic(m, 's', &name) < 0 || !bus::readDictionary(m, payload)) return 0;
-    static_cast<Events*>(userdata)->deliver(name, std::move(payload));
-    return 0;
+  static int onSignal(sd_bus_message* m, void* userdata, sd_bus_error* error) {
+    return bus::guarded(error, [&] {
+      if (sd_bus_message_has_signature(m, "sa{sv}") <= 0) return 0;
+      const char* name = nullptr;
+      xpc::object payload;
+      if (sd_bus_message_read_basic(m, 's', &name) < 0 || !bus::readDictionary(m, payload))
+        return 0;
+      static_cast<Events*>(userdata)->deliver(name, std::move(payload));
+      return 0;
+    });
   }
 };
 
@@ -71,10 +73,11 @@ struct Events : std::enable_shared_from_this<Events> {
 /// server keeps.
 void answerFromTraceProperties(const std::string& root, const xpc::object& request,
                                const Done& done) {
-  auto value = bus::findTraceProperty(
-      bus::readSmallFile(bus::tracePropertiesPath(root)),
-      xpc::dyn_cast_or_default(request.get(kKeyTraceName), ""),
-      xpc::dyn_cast_or_default(request.get(kKeyTracePropertyName), ""));
+  auto value =
+      protocol::TraceProperties::parse(
+          bus::readSmallFile(protocol::underRoot(root, protocol::kTracePropertiesPath)))
+          .get(xpc::dyn_cast_or_default(request.get(kKeyTraceName), ""),
+               xpc::dyn_cast_or_default(request.get(kKeyTracePropertyName), ""));
   if (!value) {
     done({kResultServerNotRunning, "server is not running"}, {});
     return;
@@ -87,14 +90,14 @@ class BusManager final : public Manager {
   BusManager(std::string clientName, dispatch::queue queue)
       : clientName_(std::move(clientName)), events_(std::make_shared<Events>()) {
     events_->queue = std::move(queue);
-    const char* root = std::getenv("VORN_ROOT");
-    root_ = root && *root ? root : "/";
+    root_ = protocol::platformRoot();
     Events* events = events_.get();
     // The match goes out on every new connection before any call, so the
     // server cannot send an event between Hello's answer and the match.
     link_ = std::make_unique<bus::BusLink>([events](sd_bus* bus) {
-      sd_bus_match_signal_async(bus, nullptr, kManagerName, "/org/vorn/Manager",
-                                "org.vorn.Manager1", "Event", &Events::onSignal,
+      sd_bus_match_signal_async(bus, nullptr, protocol::kManagerBusName,
+                                protocol::kManagerObjectPath, protocol::kManagerInterface,
+                                protocol::kEventSignal, &Events::onSignal,
                                 /* install_callback= */ nullptr, events);
     });
   }

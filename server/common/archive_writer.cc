@@ -14,6 +14,8 @@
 #include <memory>
 #include <utility>
 
+#include "platform/linux/fd.h"
+
 namespace vorn::server {
 
 namespace fs = std::filesystem;
@@ -29,22 +31,6 @@ struct EntryFree {
 using ArchivePtr = std::unique_ptr<archive, ArchiveFree>;
 using EntryPtr = std::unique_ptr<archive_entry, EntryFree>;
 
-class Fd {
- public:
-  explicit Fd(int fd = -1) : fd_(fd) {}
-  Fd(const Fd&) = delete;
-  Fd& operator=(const Fd&) = delete;
-  ~Fd() { reset(); }
-  int get() const { return fd_; }
-  int release() { return std::exchange(fd_, -1); }
-  void reset() {
-    if (fd_ >= 0) ::close(fd_);
-    fd_ = -1;
-  }
-
- private:
-  int fd_;
-};
 
 std::string errnoText(const std::string& what, int err) { return what + ": " + std::strerror(err); }
 

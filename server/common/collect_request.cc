@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: MIT
 #include "server/common/collect_request.h"
 
-#include "platform/vorn_constants.h"
+#include "platform/protocol/protocol.h"
 
 namespace vorn::server {
 

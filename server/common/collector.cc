@@ -8,6 +8,7 @@
 #include <vector>
 
 #include "server/common/archive_writer.h"
+#include "platform/protocol/protocol.h"
 #include "server/common/device_facts.h"
 #include "server/common/text_util.h"
 #include "server/common/timestamp_naming.h"
@@ -18,21 +19,20 @@ namespace fs = std::filesystem;
 
 namespace {
 
-constexpr const char* kLogDirPrefix = "log-bb-";
 // Reasons come from the caller; the manifest keeps a sane amount of them.
 constexpr size_t kReasonLimit = 4096;
 
 struct Source {
-  const char* from;  // under the root
+  const char* from;  // a device path, resolved under the root
   const char* into;  // under the collection directory
 };
 
 std::vector<Source> sourcesFor(CollectAction action) {
   std::vector<Source> sources = {
-      {"var/log/vorn", "vorn"},
-      {"var/wireless/Library/Logs/ZelmarBasebandManager", "ZelmarBasebandManager"},
+      {protocol::kTelephonyLogFolder, "vorn"},
+      {trace::kScratchFolder, "ZelmarBasebandManager"},
   };
-  if (action == CollectAction::telephonyLogsWithCoredump) sources.push_back({"var/lib/vorn/modem", "coredump"});
+  if (action == CollectAction::telephonyLogsWithCoredump) sources.push_back({protocol::kModemDumpFolder, "coredump"});
   return sources;
 }
 
@@ -124,20 +124,20 @@ std::string pickTimestamp(const fs::path& folder, std::time_t when) {
 }  // namespace
 
 std::string snapshotFolder(const std::string& root) {
-  return (fs::path(root) / "var/wireless/Library/Logs/CrashReporter/Baseband").string() + "/";
+  return protocol::underRoot(root, trace::kSnapshotFolder);
 }
 
 std::string directorySuffix(CollectAction action, int vendor) {
   switch (action) {
-    case CollectAction::telephonyLogs: return kTelephonySuffix;
-    case CollectAction::telephonyLogsWithCoredump: return coreDumpSuffix(vendor);
-    case CollectAction::basebandLogs: return basebandTraceSuffix(vendor);
+    case CollectAction::telephonyLogs: return trace::kTelephonyDirSuffix;
+    case CollectAction::telephonyLogsWithCoredump: return trace::coreDumpDirSuffix(vendor);
+    case CollectAction::basebandLogs: return trace::basebandTraceDirSuffix(vendor);
   }
-  return kTelephonySuffix;
+  return trace::kTelephonyDirSuffix;
 }
 
 bool nameUsesTimestamp(const std::string& name, const std::string& ts) {
-  std::string stem = kLogDirPrefix + ts;
+  std::string stem = trace::kLogDirPrefix + ts;
   if (name.compare(0, stem.size(), stem) != 0) return false;
   if (name.size() == stem.size()) return true;
   char next = name[stem.size()];
@@ -161,7 +161,7 @@ CollectOutcome Collector::collect(const CollectRequest& request, const std::atom
   const DeviceFacts facts = loadDeviceFacts(root_);
   const std::time_t when = clock_();
   const std::string ts = pickTimestamp(folder, when);
-  const std::string dirName = kLogDirPrefix + ts + directorySuffix(request.action, facts.vendor);
+  const std::string dirName = trace::kLogDirPrefix + ts + directorySuffix(request.action, facts.vendor);
   // Built under a hidden name so that nothing incomplete ever carries a
   // collection's name, directory or archive.
   const fs::path work = folder / ("." + dirName + ".partial");
@@ -178,7 +178,9 @@ CollectOutcome Collector::collect(const CollectRequest& request, const std::atom
   std::vector<std::string> files;
   std::string error;
   for (const auto& source : sourcesFor(request.action)) {
-    if (!copyTree(fs::path(root_) / source.from, work / source.into, cancel, &files, &error)) return fail(error);
+    // Without the folder's trailing '/', so that a file in its place is seen
+    // as what it is rather than as missing.
+    if (!copyTree(fs::path(protocol::underRoot(root_, source.from)).parent_path(), work / source.into, cancel, &files, &error)) return fail(error);
   }
   if (!writeTextFile(work / "manifest.txt", manifestText(request, ts, when, facts, files), &error)) return fail(error);
 
@@ -190,7 +192,7 @@ CollectOutcome Collector::collect(const CollectRequest& request, const std::atom
     job.sourceDir = work.string();
     job.entryPrefix = dirName;
     job.format = request.compression == Compression::tar ? ArchiveFormat::tar : ArchiveFormat::tarGz;
-    job.finalPath = (folder / (kLogDirPrefix + ts + (job.format == ArchiveFormat::tar ? ".tar" : ".tar.gz"))).string();
+    job.finalPath = (folder / (trace::kLogDirPrefix + ts + (job.format == ArchiveFormat::tar ? ".tar" : ".tar.gz"))).string();
     if (!listTree(job.sourceDir, &job.entries, &error)) return fail(error);
     if (!writeArchive(job, cancel, &error)) return fail(error);
     fs::remove_all(work, ec);

@@ -90,12 +90,12 @@ bool DaemonLoop::after(long delayMs, std::function<void()> fn) {
   return true;
 }
 
-void DaemonLoop::sendReply(MessagePtr reply, long delayMs) {
+void DaemonLoop::sendReply(bus::MessagePtr reply, long delayMs) {
   if (delayMs <= 0) {
     sd_bus_send(bus_.get(), reply.get(), nullptr);
     return;
   }
-  auto shared = std::make_shared<MessagePtr>(std::move(reply));
+  auto shared = std::make_shared<bus::MessagePtr>(std::move(reply));
   sd_bus* b = bus_.get();
   if (!after(delayMs, [b, shared] { sd_bus_send(b, shared->get(), nullptr); })) {
     sd_bus_send(b, shared->get(), nullptr);

@@ -4,7 +4,7 @@
 #include <functional>
 #include <string>
 
-#include "server/common/bus_handles.h"
+#include "platform/linux/bus_handles.h"
 
 /// The event loop both daemons run: the system bus, SIGTERM/SIGINT, and
 /// timers for delayed answers, all on one thread.
@@ -29,7 +29,7 @@ class DaemonLoop {
   bool after(long delayMs, std::function<void()> fn);
 
   /// Sends `reply` after `delayMs`; the reply is held until then.
-  void sendReply(MessagePtr reply, long delayMs);
+  void sendReply(bus::MessagePtr reply, long delayMs);
 
   /// Takes a well-known name; false (with `error`) when the bus refuses.
   bool requestName(const char* name, std::string* error);
@@ -43,10 +43,10 @@ class DaemonLoop {
  private:
   static int onSignal(sd_event_source* s, const struct signalfd_siginfo* si, void* userdata);
 
-  EventPtr event_;
-  BusPtr bus_;
-  EventSourcePtr sigterm_;
-  EventSourcePtr sigint_;
+  bus::EventPtr event_;
+  bus::BusPtr bus_;
+  bus::EventSourcePtr sigterm_;
+  bus::EventSourcePtr sigint_;
   std::function<void()> onStop_;
   bool stopping_ = false;
 };

@@ -1,16 +1,11 @@
 // SPDX-License-Identifier: MIT
 #include "server/common/device_facts.h"
 
-#include <filesystem>
-
 #include "platform/linux/text_lines.h"
+#include "platform/protocol/protocol.h"
 #include "server/common/text_util.h"
 
 namespace vorn::server {
-
-namespace {
-constexpr int kVendorWithTraceSuffix = 2;
-}
 
 DeviceFacts parseDeviceFacts(std::string_view text) {
   // The same reading of device.conf as the client library's.
@@ -26,15 +21,7 @@ DeviceFacts parseDeviceFacts(std::string_view text) {
 }
 
 DeviceFacts loadDeviceFacts(const std::string& root) {
-  return parseDeviceFacts(bus::readSmallFile((std::filesystem::path(root) / "etc/vorn/device.conf").string()));
-}
-
-std::string basebandTraceSuffix(int vendor) {
-  return vendor == kVendorWithTraceSuffix ? "-bb-trace" : "-diag";
-}
-
-std::string coreDumpSuffix(int vendor) {
-  return vendor == kVendorWithTraceSuffix ? "-coredump" : "-cd";
+  return parseDeviceFacts(bus::readSmallFile(protocol::underRoot(root, protocol::kDeviceConfPath)));
 }
 
 }  // namespace vorn::server

@@ -25,15 +25,4 @@ DeviceFacts parseDeviceFacts(std::string_view text);
 /// Reads `<root>/etc/vorn/device.conf`; a missing file gives the defaults.
 DeviceFacts loadDeviceFacts(const std::string& root);
 
-/// Suffix of baseband trace directory names: "-bb-trace" for vendor 2,
-/// "-diag" for any other vendor.
-std::string basebandTraceSuffix(int vendor);
-
-/// Suffix of core-dump directory names: "-coredump" for vendor 2, "-cd"
-/// otherwise.
-std::string coreDumpSuffix(int vendor);
-
-/// Suffix of telephony log directory names, the same for every vendor.
-inline constexpr const char* kTelephonySuffix = "-tel";
-
 }  // namespace vorn::server

@@ -3,6 +3,7 @@
 
 #include <filesystem>
 
+#include "platform/protocol/protocol.h"
 #include "server/common/timestamp_naming.h"
 
 namespace vorn::server {
@@ -10,7 +11,7 @@ namespace vorn::server {
 namespace fs = std::filesystem;
 
 std::optional<std::string> newestTimestamp(const std::vector<std::string>& names, const std::string& suffix) {
-  static const std::string kPrefix = "log-bb-";
+  const std::string kPrefix = trace::kLogDirPrefix;
   std::optional<std::string> best;
   std::optional<TimestampKey> bestKey;
   for (const auto& name : names) {

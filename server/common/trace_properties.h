@@ -1,43 +1,18 @@
 // SPDX-License-Identifier: MIT
 #pragma once
 
-#include <map>
-#include <optional>
 #include <string>
-#include <string_view>
 
-/// The server's persisted trace properties: `<root>/var/lib/vorn/trace.properties`,
-/// one `TraceName.PropertyName=value` line each. The client library reads the
-/// same file while the server is down, so the format is part of the protocol.
+#include "platform/protocol/trace_properties.h"
+
+/// The server's side of its persisted trace properties: what it starts with,
+/// and loading and saving the file (its syntax is the protocol's).
 namespace vorn::server {
 
-class TraceProperties {
- public:
-  /// The values the server starts with when the file does not say otherwise.
-  static TraceProperties defaults();
+using protocol::TraceProperties;
 
-  /// Parses the file's text. Blank lines and lines starting with '#' are
-  /// skipped; blanks around key and value are trimmed; a line without '=' or
-  /// without a "Trace.Property" key is ignored. A later line wins.
-  static TraceProperties parse(std::string_view text);
-
-  /// One line per property, sorted by key, each ending in '\n'.
-  std::string serialize() const;
-
-  std::optional<std::string> get(std::string_view trace, std::string_view property) const;
-  void set(std::string_view trace, std::string_view property, std::string value);
-
-  /// Entries of `other` replace or add to ours.
-  void overlay(const TraceProperties& other);
-
-  const std::map<std::string, std::string>& entries() const { return entries_; }
-
- private:
-  std::map<std::string, std::string> entries_;
-};
-
-/// Where the file lies under the platform root.
-std::string tracePropertiesPath(const std::string& root);
+/// `Baseband.Enabled=1` and `SystemLogs.Mode=1`.
+TraceProperties defaultTraceProperties();
 
 /// Loads the properties for a starting server: the defaults overlaid by the
 /// file. When the file is missing the defaults are written to it (creating

@@ -1,9 +1,8 @@
 // SPDX-License-Identifier: MIT
 #include "server/helper/helper_service.h"
 
-#include <exception>
-
-#include "platform/vorn_constants.h"
+#include "platform/protocol/protocol.h"
+#include "platform/linux/bus_guard.h"
 #include "platform/linux/bus_message.h"
 #include "server/common/collector.h"
 #include "server/common/device_facts.h"
@@ -22,7 +21,7 @@ HelperAnswer performHelperTask(const std::string& root, std::uint32_t task, cons
   if (!timeout.isNull() && timeout.asInt64() == nullptr && timeout.asUint64() == nullptr) {
     return {status::kBadRequest, "Timeout must be a number of milliseconds", {}};
   }
-  auto ts = newestSnapshotTimestamp(snapshotFolder(root), basebandTraceSuffix(loadDeviceFacts(root).vendor));
+  auto ts = newestSnapshotTimestamp(snapshotFolder(root), trace::basebandTraceDirSuffix(loadDeviceFacts(root).vendor));
   if (!ts) return {status::kCollectionFailed, "no baseband snapshot", {}};
   return {0, "", xpc::object::dictionary({{helper::kKeyTimestampString, xpc::object::string(*ts)}})};
 }
@@ -32,30 +31,24 @@ HelperService::HelperService(const HelperOptions& options, DaemonLoop& loop) : o
 bool HelperService::start(std::string* error) {
   static const sd_bus_vtable kVtable[] = {
       SD_BUS_VTABLE_START(0),
-      SD_BUS_METHOD_WITH_ARGS("Perform", SD_BUS_ARGS("s", client_name, "u", task, "s", command, "a{sv}", request),
+      SD_BUS_METHOD_WITH_ARGS(protocol::kPerformMethod, SD_BUS_ARGS("s", client_name, "u", task, "s", command, "a{sv}", request),
                               SD_BUS_RESULT("i", status, "s", description, "a{sv}", response),
                               &HelperService::onPerform, SD_BUS_VTABLE_UNPRIVILEGED),
       SD_BUS_VTABLE_END,
   };
   sd_bus_slot* slot = nullptr;
-  if (sd_bus_add_object_vtable(loop_.bus(), &slot, kHelperObjectPath, kHelperInterface, kVtable, this) < 0) {
-    *error = "cannot publish " + std::string(kHelperObjectPath);
+  if (sd_bus_add_object_vtable(loop_.bus(), &slot, protocol::kHelperObjectPath, protocol::kHelperInterface, kVtable, this) < 0) {
+    *error = "cannot publish " + std::string(protocol::kHelperObjectPath);
     return false;
   }
   slot_.reset(slot);
-  return loop_.requestName(kHelperBusName, error);
+  return loop_.requestName(protocol::kHelperBusName, error);
 }
 
-void HelperService::stopping() { loop_.releaseName(kHelperBusName); }
+void HelperService::stopping() { loop_.releaseName(protocol::kHelperBusName); }
 
 int HelperService::onPerform(sd_bus_message* m, void* userdata, sd_bus_error* err) {
-  try {
-    return static_cast<HelperService*>(userdata)->perform(m);
-  } catch (const std::exception& e) {
-    return sd_bus_error_set(err, "org.vorn.Error.Internal", e.what());
-  } catch (...) {
-    return sd_bus_error_set(err, "org.vorn.Error.Internal", "unexpected failure");
-  }
+  return bus::guarded(err, [&] { return static_cast<HelperService*>(userdata)->perform(m); });
 }
 
 int HelperService::perform(sd_bus_message* m) {
@@ -71,7 +64,7 @@ int HelperService::perform(sd_bus_message* m) {
                                       : performHelperTask(options_.root, task, command, request);
   sd_bus_message* raw = nullptr;
   if ((r = sd_bus_message_new_method_return(m, &raw)) < 0) return r;
-  MessagePtr reply(raw);
+  bus::MessagePtr reply(raw);
   if ((r = sd_bus_message_append(reply.get(), "is", answer.status, answer.description.c_str())) < 0) return r;
   if (!bus::appendDictionary(reply.get(), answer.response)) return -ENOMEM;
   loop_.sendReply(std::move(reply), options_.replyDelayMs);

@@ -4,16 +4,12 @@
 #include <string>
 
 #include "platform/xpc.h"
-#include "server/common/bus_handles.h"
+#include "platform/linux/bus_handles.h"
 #include "server/common/daemon_loop.h"
 #include "server/common/daemon_options.h"
 
 /// The helper service's bus object: org.vorn.Helper1 at /org/vorn/Helper.
 namespace vorn::server {
-
-inline constexpr const char* kHelperBusName = "org.vorn.Helper";
-inline constexpr const char* kHelperObjectPath = "/org/vorn/Helper";
-inline constexpr const char* kHelperInterface = "org.vorn.Helper1";
 
 struct HelperAnswer {
   int status = 0;
@@ -38,7 +34,7 @@ class HelperService {
 
   const HelperOptions& options_;
   DaemonLoop& loop_;
-  SlotPtr slot_;
+  bus::SlotPtr slot_;
 };
 
 }  // namespace vorn::server

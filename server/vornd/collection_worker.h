@@ -49,7 +49,7 @@ class CollectionWorker {
   DaemonLoop& loop_;
   Collector& collector_;
   int wakeFd_ = -1;
-  EventSourcePtr wakeSource_;
+  bus::EventSourcePtr wakeSource_;
   std::thread thread_;
   std::mutex mutex_;
   std::condition_variable cv_;

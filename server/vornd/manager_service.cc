@@ -3,29 +3,13 @@
 
 #include <unistd.h>
 
-#include <exception>
-
-#include "platform/vorn_constants.h"
+#include "platform/protocol/protocol.h"
+#include "platform/linux/bus_guard.h"
 #include "platform/linux/bus_message.h"
 
 namespace vorn::server {
 
 namespace {
-
-constexpr const char* kInternalError = "org.vorn.Error.Internal";
-
-/// Runs a handler and turns anything it throws into an error reply, so no
-/// exception unwinds through sd-bus's C frames.
-template <typename Fn>
-int guarded(sd_bus_error* err, Fn&& fn) {
-  try {
-    return fn();
-  } catch (const std::exception& e) {
-    return sd_bus_error_set(err, kInternalError, e.what());
-  } catch (...) {
-    return sd_bus_error_set(err, kInternalError, "unexpected failure");
-  }
-}
 
 xpc::object stateDict(const std::string& state) {
   return xpc::object::dictionary({{kKeyServerState, xpc::object::string(state)}});
@@ -40,23 +24,23 @@ ManagerService::ManagerService(const ManagerOptions& options, DaemonLoop& loop, 
 bool ManagerService::start(std::string* error) {
   static const sd_bus_vtable kVtable[] = {
       SD_BUS_VTABLE_START(0),
-      SD_BUS_METHOD_WITH_ARGS("Hello", SD_BUS_ARGS("s", client_name), SD_BUS_RESULT("a{sv}", server_state),
+      SD_BUS_METHOD_WITH_ARGS(protocol::kHelloMethod, SD_BUS_ARGS("s", client_name), SD_BUS_RESULT("a{sv}", server_state),
                               &ManagerService::onHello, SD_BUS_VTABLE_UNPRIVILEGED),
-      SD_BUS_METHOD_WITH_ARGS("PerformCommand", SD_BUS_ARGS("s", client_name, "s", command, "a{sv}", request),
+      SD_BUS_METHOD_WITH_ARGS(protocol::kPerformCommandMethod, SD_BUS_ARGS("s", client_name, "s", command, "a{sv}", request),
                               SD_BUS_RESULT("i", status, "s", description, "a{sv}", response), &ManagerService::onPerformCommand,
                               SD_BUS_VTABLE_UNPRIVILEGED),
-      SD_BUS_SIGNAL_WITH_ARGS("Event", SD_BUS_ARGS("s", name, "a{sv}", payload), 0),
+      SD_BUS_SIGNAL_WITH_ARGS(protocol::kEventSignal, SD_BUS_ARGS("s", name, "a{sv}", payload), 0),
       SD_BUS_VTABLE_END,
   };
   sd_bus_slot* slot = nullptr;
   // The handlers find `this` through the vtable's userdata.
-  int r = sd_bus_add_object_vtable(loop_.bus(), &slot, kManagerObjectPath, kManagerInterface, kVtable, this);
+  int r = sd_bus_add_object_vtable(loop_.bus(), &slot, protocol::kManagerObjectPath, protocol::kManagerInterface, kVtable, this);
   if (r < 0) {
-    *error = "cannot publish " + std::string(kManagerObjectPath);
+    *error = "cannot publish " + std::string(protocol::kManagerObjectPath);
     return false;
   }
   slot_.reset(slot);
-  if (!loop_.requestName(kManagerBusName, error)) return false;
+  if (!loop_.requestName(protocol::kManagerBusName, error)) return false;
   std::string state = options_.state;
   if (options_.startDelayMs > 0) {
     loop_.after(options_.startDelayMs, [this, state] { announce(state); });
@@ -68,14 +52,15 @@ bool ManagerService::start(std::string* error) {
 
 void ManagerService::stopping() {
   announce("Stopping");
-  loop_.releaseName(kManagerBusName);
+  loop_.releaseName(protocol::kManagerBusName);
 }
 
 void ManagerService::announce(const std::string& state) {
   state_ = state;
   sd_bus_message* raw = nullptr;
-  if (sd_bus_message_new_signal(loop_.bus(), &raw, kManagerObjectPath, kManagerInterface, "Event") < 0) return;
-  MessagePtr signal(raw);
+  if (sd_bus_message_new_signal(loop_.bus(), &raw, protocol::kManagerObjectPath, protocol::kManagerInterface,
+                                 protocol::kEventSignal) < 0) return;
+  bus::MessagePtr signal(raw);
   if (sd_bus_message_append_basic(signal.get(), 's', kEventServerStateChange) < 0) return;
   if (!bus::appendDictionary(signal.get(), stateDict(state))) return;
   sd_bus_send(loop_.bus(), signal.get(), nullptr);
@@ -85,23 +70,23 @@ void ManagerService::announce(const std::string& state) {
 
 int ManagerService::onHello(sd_bus_message* m, void* userdata, sd_bus_error* err) {
   auto* self = static_cast<ManagerService*>(userdata);
-  return guarded(err, [&] { return self->hello(m, err); });
+  return bus::guarded(err, [&] { return self->hello(m, err); });
 }
 
 int ManagerService::onPerformCommand(sd_bus_message* m, void* userdata, sd_bus_error* err) {
   auto* self = static_cast<ManagerService*>(userdata);
-  return guarded(err, [&] { return self->performCommand(m, err); });
+  return bus::guarded(err, [&] { return self->performCommand(m, err); });
 }
 
 int ManagerService::hello(sd_bus_message* m, sd_bus_error*) {
   const char* client = nullptr;
   int r = sd_bus_message_read_basic(m, 's', &client);
   if (r < 0) return r;
-  if (options_.exitOn.count("Hello")) _exit(0);
-  if (options_.noReply.count("Hello")) return 1;
+  if (options_.exitOn.count(protocol::kHelloMethod)) _exit(0);
+  if (options_.noReply.count(protocol::kHelloMethod)) return 1;
   sd_bus_message* raw = nullptr;
   if ((r = sd_bus_message_new_method_return(m, &raw)) < 0) return r;
-  MessagePtr answer(raw);
+  bus::MessagePtr answer(raw);
   if (!bus::appendDictionary(answer.get(), stateDict(state_))) return -ENOMEM;
   loop_.sendReply(std::move(answer), options_.replyDelayMs);
   return 1;
@@ -154,7 +139,7 @@ void ManagerService::traceDumpState(sd_bus_message* call, const xpc::object& req
     reply(call, {status::kBadRequest, "TraceDumpState needs a collect action and a compression of 0, 1 or 2", {}});
     return;
   }
-  auto held = std::make_shared<MessagePtr>(retain(call));
+  auto held = std::make_shared<bus::MessagePtr>(bus::retain(call));
   worker_.submit(*parsed, [this, held](const CollectOutcome& outcome) {
     if (outcome.ok) {
       reply(held->get(),
@@ -168,7 +153,7 @@ void ManagerService::traceDumpState(sd_bus_message* call, const xpc::object& req
 void ManagerService::reply(sd_bus_message* call, const Answer& answer) {
   sd_bus_message* raw = nullptr;
   if (sd_bus_message_new_method_return(call, &raw) < 0) return;
-  MessagePtr msg(raw);
+  bus::MessagePtr msg(raw);
   bool ok = sd_bus_message_append(msg.get(), "is", answer.status, answer.description.c_str()) >= 0 &&
             bus::appendDictionary(msg.get(), answer.response);
   if (!ok) {

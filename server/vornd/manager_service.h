@@ -4,7 +4,7 @@
 #include <string>
 
 #include "platform/xpc.h"
-#include "server/common/bus_handles.h"
+#include "platform/linux/bus_handles.h"
 #include "server/common/daemon_loop.h"
 #include "server/common/daemon_options.h"
 #include "server/common/trace_properties.h"
@@ -12,10 +12,6 @@
 
 /// The server's bus object: org.vorn.Manager1 at /org/vorn/Manager.
 namespace vorn::server {
-
-inline constexpr const char* kManagerBusName = "org.vorn.Manager";
-inline constexpr const char* kManagerObjectPath = "/org/vorn/Manager";
-inline constexpr const char* kManagerInterface = "org.vorn.Manager1";
 
 class ManagerService {
  public:
@@ -54,7 +50,7 @@ class ManagerService {
   DaemonLoop& loop_;
   TraceProperties properties_;
   CollectionWorker& worker_;
-  SlotPtr slot_;
+  bus::SlotPtr slot_;
   std::string state_ = "Starting";
 };
 

@@ -10,8 +10,8 @@
 #include <optional>
 #include <set>
 
-#include "platform/vorn_constants.h"
-#include "server/common/bus_handles.h"
+#include "platform/protocol/protocol.h"
+#include "platform/linux/bus_handles.h"
 #include "platform/linux/bus_message.h"
 #include "tests/support/private_bus.h"
 
@@ -50,18 +50,18 @@ std::set<std::string> namesIn(const fs::path& dir) {
 Reply call(const std::string& service, const char* member, const std::function<int(sd_bus_message*)>& append) {
   sd_bus* raw = nullptr;
   if (sd_bus_open_system(&raw) < 0) return {"test.NoBus", -1, {}};
-  vorn::server::BusPtr bus(raw);
+  vorn::bus::BusPtr bus(raw);
   const std::string name = "org.vorn." + service;
   sd_bus_message* m = nullptr;
   sd_bus_message_new_method_call(raw, &m, name.c_str(), ("/org/vorn/" + service).c_str(), (name + "1").c_str(), member);
-  vorn::server::MessagePtr message(m);
+  vorn::bus::MessagePtr message(m);
   if (m == nullptr || append(m) < 0) return {"test.CannotBuild", -1, {}};
   sd_bus_error error = SD_BUS_ERROR_NULL;
   sd_bus_message* r = nullptr;
   Reply out;
   if (sd_bus_call(raw, m, 60'000'000, &error, &r) < 0) out = {error.name ? error.name : "test.CallFailed", -1, {}};
   sd_bus_error_free(&error);
-  vorn::server::MessagePtr reply(r);
+  vorn::bus::MessagePtr reply(r);
   const char* description = nullptr;  // (isa{sv}) for commands, (a{sv}) for Hello
   bool isStatus = out.error.empty() && sd_bus_message_get_signature(r, 1)[0] == 'i';
   if (out.error.empty() && ((isStatus && sd_bus_message_read(r, "is", &out.status, &description) < 0) ||

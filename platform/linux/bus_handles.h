@@ -6,8 +6,9 @@
 
 #include <memory>
 
-/// Owning handles for the sd-bus and sd-event objects the daemons hold.
-namespace vorn::server {
+/// Owning handles of the sd-bus and sd-event objects that the client
+/// library and the daemons hold.
+namespace vorn::bus {
 
 struct BusUnref {
   void operator()(sd_bus* bus) const { sd_bus_flush_close_unref(bus); }
@@ -34,4 +35,4 @@ using EventSourcePtr = std::unique_ptr<sd_event_source, EventSourceUnref>;
 /// Takes a new reference to `m` (method calls answered later).
 inline MessagePtr retain(sd_bus_message* m) { return MessagePtr(sd_bus_message_ref(m)); }
 
-}  // namespace vorn::server
+}  // namespace vorn::bus
