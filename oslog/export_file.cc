@@ -11,9 +11,16 @@ namespace oslog {
 bool ExportFile::create(const std::string& path) {
   close();
   writeError_ = 0;
-  fd_ = ::open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666);
+  // Opened without waiting: a FIFO that nobody reads fails at once (ENXIO)
+  // instead of hanging before the export's time bound even starts.
+  fd_ = ::open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NONBLOCK | O_NOCTTY, 0666);
+  if (fd_ < 0) return false;
+  // Writes block as usual, so a reader that is slower than the journal gets
+  // every line rather than a short write.
+  const int flags = ::fcntl(fd_, F_GETFL);
+  if (flags >= 0) ::fcntl(fd_, F_SETFL, flags & ~O_NONBLOCK);
   buffer_.reserve(kBlockBytes + 4096);
-  return fd_ >= 0;
+  return true;
 }
 
 void ExportFile::flush() {

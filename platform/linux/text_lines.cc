@@ -1,8 +1,14 @@
 // SPDX-License-Identifier: MIT
 #include "platform/linux/text_lines.h"
 
-#include <fstream>
-#include <iterator>
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+
+#include "platform/linux/fd.h"
 
 namespace vorn::bus {
 
@@ -30,12 +36,17 @@ void forEachSetting(std::string_view text,
 }
 
 std::string readSmallFile(const std::string& path, std::size_t limit) {
-  std::ifstream in(path, std::ios::binary);
-  if (!in) return {};
+  Fd fd(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
+  struct stat st {};
+  if (!fd || ::fstat(fd.get(), &st) != 0 || !S_ISREG(st.st_mode)) return {};
   std::string text;
   char buffer[4096];
-  while (text.size() < limit && in.read(buffer, sizeof buffer).gcount() > 0)
-    text.append(buffer, std::size_t(in.gcount()));
+  while (text.size() < limit) {
+    const ssize_t n = ::read(fd.get(), buffer, std::min(sizeof buffer, limit - text.size()));
+    if (n < 0 && errno == EINTR) continue;
+    if (n <= 0) break;
+    text.append(buffer, std::size_t(n));
+  }
   return text;
 }
 

@@ -16,7 +16,9 @@ std::string_view trim(std::string_view s);
 void forEachSetting(std::string_view text,
                     const std::function<void(std::string_view key, std::string_view value)>& setting);
 
-/// The whole content of a small file; empty when it cannot be read.
+/// The content of a small regular file, at most `limit` bytes; empty when it
+/// cannot be read or is not a regular file. The open never waits (a FIFO
+/// with no writer would block it for ever), and nothing else is read.
 std::string readSmallFile(const std::string& path, std::size_t limit = 1 << 20);
 
 }  // namespace vorn::bus
