@@ -24,6 +24,13 @@ void CommandBase::addCommandHandler(std::string name, CommandHandler handler, st
   if (!help.empty()) helpTexts.insert_or_assign(std::move(name), std::move(help));
 }
 
+void CommandBase::addCommandHandler(std::string name, CommandHandler handler, std::string help,
+                                    OptionWords options) {
+  if (!handler) return;
+  optionWords.insert_or_assign(name, std::move(options));
+  addCommandHandler(std::move(name), std::move(handler), std::move(help));
+}
+
 void CommandBase::addSubCommand(std::string name, std::shared_ptr<CommandBase> command) {
   if (command) subCommands.insert_or_assign(std::move(name), std::move(command));
 }
@@ -48,6 +55,25 @@ bool CommandBase::isValidCommand(std::string name) { return handlers.contains(na
 std::string CommandBase::getHierarchy() { return hierarchy; }
 
 std::weak_ptr<CommandBase> CommandBase::getParent() { return parent; }
+
+namespace {
+template <typename Map>
+std::vector<std::string> keysOf(const Map& table) {
+  std::vector<std::string> keys;
+  keys.reserve(table.size());
+  for (const auto& entry : table) keys.push_back(entry.first);
+  return keys;
+}
+}  // namespace
+
+std::vector<std::string> CommandBase::getHandlerNames() const { return keysOf(handlers); }
+
+std::vector<std::string> CommandBase::getSubCommandNames() const { return keysOf(subCommands); }
+
+OptionWords CommandBase::getOptionWords(const std::string& handler) const {
+  auto found = optionWords.find(handler);
+  return found == optionWords.end() ? OptionWords{} : found->second;
+}
 
 bool CommandBase::execCommand(std::string name, std::list<std::string> args) {
   auto found = handlers.find(name);

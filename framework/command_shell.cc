@@ -3,12 +3,21 @@
 
 #include <iostream>
 
+#include "framework/colour.h"
+#include "framework/completion.h"
+
 bool CommandShell::run(std::list<std::string> words) {
   rootCommand = createRootCommand();
   if (!rootCommand) return false;
   currentCommand = rootCommand;
   if (!words.empty()) words.pop_back();  // the program's name
-  if (words.empty()) workingCommand = rootCommand;
+  if (words.empty()) {
+    workingCommand = rootCommand;
+    // The reader completes between lines, when the working command is where
+    // the next line starts.
+    lineReader->setCompleter(
+        [this](std::string_view beforeCursor) { return completeLine(workingCommand, beforeCursor); });
+  }
   auto groups = splitCmdList(words);
 
   bool success = true;
@@ -24,11 +33,14 @@ bool CommandShell::run(std::list<std::string> words) {
     if (!workingCommand) return success;
 
     currentCommand = workingCommand;
-    std::cout << "(" << currentCommand->getHierarchy() << ")>> " << std::flush;
     std::string line;
-    if (!std::getline(std::cin, line)) return false;
+    if (!lineReader->readLine("(" + currentCommand->getHierarchy() + ")>> ", line)) return false;
     groups = splitCmdList(convertLineToList(line));
   }
+}
+
+void CommandShell::setLineReader(std::unique_ptr<LineReader> reader) {
+  if (reader) lineReader = std::move(reader);
 }
 
 CommandShell::Outcome CommandShell::runGroup(std::list<std::string> words) {
@@ -102,6 +114,6 @@ CommandShell::Outcome CommandShell::changeDirectory(std::list<std::string>& rest
 
 void CommandShell::reportInvalid(const std::string& word) {
   std::cout << std::endl;
-  std::cout << "Invalid command option '" << "\x1b[31m" << word << "\x1b[39m" << "'";
+  std::cout << "Invalid command option '" << colour::red() << word << colour::defaultColour() << "'";
   currentCommand->displayHelp();
 }

@@ -7,9 +7,11 @@
 #include <vector>
 
 #include "framework/command_base.h"
+#include "framework/line_reader.h"
 
 /// Drives a command tree: once over the command line's words, or as an
-/// interactive prompt on standard input when no words were given.
+/// interactive prompt when no words were given. The prompt's lines come from
+/// a line reader, by default the plain one on standard input and output.
 ///
 /// Word lists hold their words last-first: the next word is `back()`.
 class CommandShell {
@@ -23,6 +25,9 @@ class CommandShell {
   /// `words` is the whole argument list, program name included (last).
   /// True when the session succeeded.
   bool run(std::list<std::string> words);
+
+  /// Replaces the reader of the interactive prompt; call before `run`.
+  void setLineReader(std::unique_ptr<LineReader> reader);
 
   static std::list<std::string> convertCmdArgsToList(int count, char* const* vector);
   static std::list<std::string> convertLineToList(const std::string& line);
@@ -39,4 +44,5 @@ class CommandShell {
   std::shared_ptr<CommandBase> rootCommand;
   std::shared_ptr<CommandBase> workingCommand;
   std::shared_ptr<CommandBase> currentCommand;
+  std::unique_ptr<LineReader> lineReader = std::make_unique<PlainLineReader>();
 };

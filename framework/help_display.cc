@@ -2,18 +2,18 @@
 #include <iomanip>
 #include <iostream>
 
+#include "framework/colour.h"
 #include "framework/command_base.h"
 
 namespace {
 constexpr int kColumn = 16;
-constexpr const char* kGreen = "\x1b[32m";
-constexpr const char* kDefaultColour = "\x1b[39m";
 }  // namespace
 
 void CommandBase::displayHelp() {
   auto& out = std::cout;
   out << std::endl;
-  out << "Options for command '" << kGreen << name << kDefaultColour << "':" << std::endl;
+  out << "Options for command '" << colour::green() << name << colour::defaultColour()
+      << "':" << std::endl;
   out << std::endl;
   for (const auto& [handlerName, handler] : handlers) {
     auto help = helpTexts.find(handlerName);
