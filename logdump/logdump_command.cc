@@ -29,26 +29,33 @@ bool LogdumpCommand::isAllowed(std::string name) {
 }
 
 void LogdumpCommand::registerCommands() {
+  const OptionWords telephonyWords{
+      .words = {"nocompress", "tar.gz", "tar", "nonui"}, .leadingOnly = true};
+  const OptionWords basebandWords{.words = {"nocompress", "tar.gz", "tar"}, .leadingOnly = true};
+  // History and path come first; then "-p" and "-i" switch what the words mean.
+  const OptionWords oslogWords{.positionals = 2, .words = {"-p", "-i"}};
+
   // The handlers are stored in this node's own table, so the node outlives them.
   addCommandHandler(
       "tel",
       [this](dispatch::group group, std::list<std::string> args) {
         return collectTelephonyLogs(*this, std::move(group), std::move(args), TelephonyDump::logs);
       },
-      "[nocompress|tar.gz|tar] [nonui] <reason> collect telephony logs");
+      "[nocompress|tar.gz|tar] [nonui] <reason> collect telephony logs", telephonyWords);
   addCommandHandler(
       "core",
       [this](dispatch::group group, std::list<std::string> args) {
         return collectTelephonyLogs(*this, std::move(group), std::move(args),
                                     TelephonyDump::logsWithCoredump);
       },
-      "[nocompress|tar.gz|tar] [nonui] <reason> collect telephony logs with coredump");
+      "[nocompress|tar.gz|tar] [nonui] <reason> collect telephony logs with coredump",
+      telephonyWords);
   addCommandHandler(
       "bb",
       [this](dispatch::group, std::list<std::string> args) {
         return collectBasebandLogs(*this, std::move(args));
       },
-      "[nocompress|tar.gz|tar] <reason> collect baseband logs only");
+      "[nocompress|tar.gz|tar] <reason> collect baseband logs only", basebandWords);
   addCommandHandler(
       "oslog",
       [](dispatch::group group, std::list<std::string> args) {
@@ -56,7 +63,8 @@ void LogdumpCommand::registerCommands() {
         return logdump::runOsLogCommand(std::move(args));
       },
       "[history size] [output txt file path] -p <process1 process2..> -i <imagePath1 imagePath2..> "
-      "collect oslog to txt");
+      "collect oslog to txt",
+      oslogWords);
 }
 
 bool isSystemLogsTraceMode3(LogdumpCommand& command) {

@@ -7,7 +7,10 @@
 #include <memory>
 #include <string>
 
+#include "framework/colour.h"
 #include "platform/device.h"
+#include "terminal/open_line_reader.h"
+#include "terminal/terminal_facts.h"
 #include "toolbase/config.h"
 #include "tool/vorn_shell.h"
 
@@ -30,6 +33,9 @@ void* RunShellThread(void* wordList) {
   // exit() does not unwind this stack: the shell, and with it the tree, the
   // connection and the queue, stay alive until the process is gone.
   auto shell = std::make_shared<VornShell>();
+  const terminal::Facts facts = terminal::probe();
+  colour::setEnabled(facts.colour);
+  shell->setLineReader(terminal::openLineReader(facts, getprogname()));
   const bool ok = shell->run(words);
   std::exit(ok ? 0 : 1);
 }
