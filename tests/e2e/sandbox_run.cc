@@ -18,13 +18,13 @@ std::string slurp(const std::filesystem::path& path) {
   return text.str();
 }
 
+}  // namespace
+
 std::string quoted(const std::string& word) {
   std::string q = "'";
   for (char c : word) q += c == '\'' ? std::string("'\\''") : std::string(1, c);
   return q + "'";
 }
-
-}  // namespace
 
 SandboxResult runInSandbox(const std::vector<std::string>& sandboxOptions, const std::string& script,
                            const std::string& input) {

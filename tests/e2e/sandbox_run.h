@@ -14,3 +14,6 @@ struct SandboxResult {
 
 SandboxResult runInSandbox(const std::vector<std::string>& sandboxOptions, const std::string& script,
                            const std::string& input = {});
+
+/// `word` quoted for a shell command line.
+std::string quoted(const std::string& word);

@@ -1,0 +1,131 @@
+// SPDX-License-Identifier: MIT
+#include <gtest/gtest.h>
+
+#include <cstdio>
+
+#include "sandbox_run.h"
+
+namespace {
+
+/// One step of a terminal session: keys to send, or a regex that the screen
+/// must show next (within the driver's deadline).
+struct Step {
+  const char* kind;
+  std::string text;
+};
+Step send(std::string keys) { return {"send", std::move(keys)}; }
+Step expect(std::string regex) { return {"expect", std::move(regex)}; }
+
+const std::string kUp = "\x1b[A";
+const std::string kKillLine = "\x15";  // Ctrl-U
+const std::string kPrompt = R"(\(/vorntool\)>> )";
+/// The end of a help, then the next prompt.
+const std::string kHelpThenPrompt = "quit\r\n\r\n" + kPrompt;
+
+std::string json(const std::vector<Step>& steps) {
+  std::string text = "[";
+  for (const auto& step : steps) {
+    text += std::string(text.size() > 1 ? "," : "") + "[\"" + step.kind + "\",\"";
+    for (unsigned char c : step.text) {
+      if (c == '"' || c == '\\') {
+        text += '\\';
+        text += static_cast<char>(c);
+      } else if (c < 0x20) {
+        char escaped[8];
+        std::snprintf(escaped, sizeof escaped, "\\u%04x", c);
+        text += escaped;
+      } else {
+        text += static_cast<char>(c);
+      }
+    }
+    text += "\"]";
+  }
+  return text + "]";
+}
+
+/// A shell command that plays `steps` against vorntool on a pseudo-terminal:
+/// a known terminal type, colour not switched off, no user's editrc, and
+/// the history under $VORN_ROOT/../state unless `env` says otherwise.
+std::string onTerminal(const std::vector<Step>& steps, const std::string& env = "",
+                       const std::string& driverOptions = "") {
+  return "env -u NO_COLOR -u EDITRC TERM=xterm HOME=\"$VORN_ROOT/..\" "
+         "XDG_STATE_HOME=\"$VORN_ROOT/../state\" " + env + " python3 " +
+         quoted(VORN_SOURCE_DIR "/tests/e2e/pty_session.py") + " " + driverOptions + " " +
+         quoted(json(steps)) + " -- vorntool";
+}
+
+TEST(VorntoolTerminal, TabCompletesFromTheCommandTree) {
+  auto r = runInSandbox({}, onTerminal({
+      expect(kPrompt),
+      send("log\t"), expect("dump "),
+      // A second Tab has nothing to add: it lists what may follow.
+      send("\t"), expect("\r\nbb +cd +core +help +oslog +tel\r\n"), expect(kPrompt + "logdump "),
+      send("\r"), expect("Options for command '\x1b\\[32mlogdump\x1b\\[39m'"), expect(kHelpThenPrompt),
+      send("logdump tel \t"), expect("\r\nnocompress +nonui +tar +tar\\.gz\r\n"),
+      expect(kPrompt + "logdump tel "),
+      send(kKillLine + "cd l\t"), expect("ogdump "), send("\r"), expect(R"(\(/vorntool/logdump\)>> )"),
+      send("quit\r"),
+  }) + " >/dev/null; echo \"status $?\"");
+  EXPECT_EQ(r.out, "status 0\n") << r.err;
+}
+
+TEST(VorntoolTerminal, UpArrowRecallsLinesAlsoAfterARestart) {
+  const std::string rootHelpThenPrompt = "vorntool\x1b\\[39m'.*" + kHelpThenPrompt;
+  const std::string first = onTerminal({
+      expect(kPrompt), send("help\r"), expect(rootHelpThenPrompt),
+      send(kUp), expect("help"), send("\r"), expect(rootHelpThenPrompt),
+      send("quit\r"),
+  });
+  const std::string second = onTerminal({
+      expect(kPrompt), send(kUp), expect("quit"), send(kUp), expect("help"),
+      send("\r"), expect(rootHelpThenPrompt),
+      send("quit\r"),
+  });
+  auto r = runInSandbox({}, first + " >/dev/null; echo \"first $?\"\n"
+                        "state=\"$VORN_ROOT/../state/vorntool\"\n"
+                        "stat -c '%a %n' \"$state\" \"$state/history\" | sed \"s|$state|STATE|\"\n"
+                        "tail -n +2 \"$state/history\"\n" +
+                        second + " >/dev/null; echo \"second $?\"");
+  EXPECT_EQ(r.out, "first 0\n700 STATE\n600 STATE/history\nhelp\nquit\nsecond 0\n") << r.err;
+}
+
+TEST(VorntoolTerminal, AnEmptyHistfileKeepsNoHistoryAndAPathIsUsedAsGiven) {
+  // Ctrl-D at an empty prompt is the end of input: status 1, as from a pipe.
+  const std::vector<Step> steps{expect(kPrompt), send("help\r"), expect(kHelpThenPrompt), send("\x04")};
+  auto r = runInSandbox({}, onTerminal(steps, "VORNTOOL_HISTFILE=") + " >/dev/null; echo \"off $?\"\n"
+                        "[ -e \"$VORN_ROOT/../state\" ] && echo 'state written' || echo 'no state'\n" +
+                        onTerminal(steps, "VORNTOOL_HISTFILE=\"$VORN_ROOT/../custom\"") +
+                        " >/dev/null; echo \"custom $?\"\n"
+                        "cat \"$VORN_ROOT/../custom\"; ls \"$VORN_ROOT/..\" | grep -c custom");
+  EXPECT_EQ(r.out, "off 1\nno state\ncustom 1\n_HiStOrY_V2_\nhelp\n1\n") << r.err;
+}
+
+TEST(VorntoolTerminal, WithOutputPipedThePromptStaysOnTheTerminal) {
+  auto r = runInSandbox({}, onTerminal({expect(kPrompt), send("help\r"), expect(kPrompt), send("quit\r")},
+                                       "", "--stdout \"$VORN_ROOT/../out\"") +
+                                " >\"$VORN_ROOT/../screen\"; echo \"status $?\"\n"
+                                "cat \"$VORN_ROOT/../out\"\n"
+                                "grep -c 'Options for command' \"$VORN_ROOT/../screen\"");
+  EXPECT_EQ(r.out, "status 0\n"
+                   "\nOptions for command '\x1b[32mvorntool\x1b[39m':\n\n"
+                   "\t         logdump  -  [bb|core|oslog|tel]\n\n"
+                   "\t              cd  -  <sub-command>\n\t            help\n\t            back\n\t            quit\n\n"
+                   "0\n")
+      << r.err;
+}
+
+TEST(VorntoolColour, NoColorAndDumbTerminalsGetTheSameTextWithoutEscapes) {
+  auto r = runInSandbox({}, R"sh(
+    plain() { sed 's/\x1b\[3[129]m//g'; }
+    coloured=$(env -u NO_COLOR TERM=xterm vorntool help | od -c)
+    [ "$coloured" = "$(env -u NO_COLOR TERM=xterm vorntool help | plain | od -c)" ] && echo "help has no colour"
+    env -u NO_COLOR TERM=xterm vorntool help | grep -c $'\x1b'
+    NO_COLOR= TERM=xterm vorntool help | grep -c $'\x1b'
+    [ "$(NO_COLOR=1 vorntool help)" = "$(env -u NO_COLOR TERM=xterm vorntool help | plain)" ] && echo "NO_COLOR: plain help"
+    [ "$(env -u NO_COLOR TERM=dumb vorntool bogus)" = "$(env -u NO_COLOR TERM=xterm vorntool bogus | plain)" ] && echo "dumb: plain report"
+    NO_COLOR=1 vorntool bogus | grep -c $'\x1b'
+    true)sh");
+  EXPECT_EQ(r.out, "1\n1\nNO_COLOR: plain help\ndumb: plain report\n0\n") << r.err;
+}
+
+}  // namespace
