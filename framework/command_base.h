@@ -54,7 +54,6 @@ class CommandBase : public std::enable_shared_from_this<CommandBase> {
   bool isValidCommand(std::string name);
   std::string getHierarchy();
   std::weak_ptr<CommandBase> getParent();
-  const std::string& getName() const { return name; }
 
   /// Handler names and listed sub-command names, in key order.
   std::vector<std::string> getHandlerNames() const;

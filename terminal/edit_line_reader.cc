@@ -31,10 +31,10 @@ EditLineReader::~EditLineReader() {
   if (options_.closeOutput && options_.output) std::fclose(options_.output);
 }
 
-bool EditLineReader::start() {
+void EditLineReader::start() {
   started_ = true;
   editor_.reset(el_init(options_.programName.c_str(), options_.input, options_.output, stderr));
-  if (!editor_) return false;
+  if (!editor_) return;
   EditLine* editor = editor_.get();
   el_set(editor, EL_CLIENTDATA, this);
   el_set(editor, EL_PROMPT, &EditLineReader::promptOf);
@@ -62,7 +62,6 @@ bool EditLineReader::start() {
   }
   // The user's ~/.editrc comes last, so that its bindings win.
   el_source(editor, nullptr);
-  return true;
 }
 
 bool EditLineReader::readLine(const std::string& prompt, std::string& line) {

@@ -2,7 +2,6 @@
 #pragma once
 
 #include <cstdio>
-#include <filesystem>
 #include <memory>
 #include <optional>
 #include <string>
@@ -44,7 +43,7 @@ class EditLineReader : public LineReader {
     void operator()(struct history* list) const;
   };
 
-  bool start();
+  void start();
   void remember(const std::string& line);
   void saveHistory();
   unsigned char complete();
