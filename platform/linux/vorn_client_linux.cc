@@ -7,6 +7,7 @@
 #include "platform/linux/bus_guard.h"
 #include "platform/linux/bus_link.h"
 #include "platform/linux/bus_message.h"
+#include "platform/linux/name_watch.h"
 #include "platform/linux/text_lines.h"
 #include "platform/protocol/trace_properties.h"
 #include "platform/vorn_client.h"
@@ -36,6 +37,11 @@ struct Events : std::enable_shared_from_this<Events> {
   std::map<std::string, EventHandler> handlers;
   bool on = false;
 
+  bool isOn() {
+    std::lock_guard lock(mutex);
+    return on;
+  }
+
   /// Hands the event to its handler on the queue; called on the I/O thread.
   void deliver(const std::string& name, xpc::object payload) {
     EventHandler handler;
@@ -47,24 +53,9 @@ struct Events : std::enable_shared_from_this<Events> {
     }
     queue.async([self = shared_from_this(), handler = std::move(handler),
                  payload = std::move(payload)] {
-      {
-        // Events switched off while this one waited on the queue stay undelivered.
-        std::lock_guard lock(self->mutex);
-        if (!self->on) return;
-      }
+      // Events switched off while this one waited on the queue stay undelivered.
+      if (!self->isOn()) return;
       handler(payload, dispatch::group());
-    });
-  }
-
-  static int onSignal(sd_bus_message* m, void* userdata, sd_bus_error* error) {
-    return bus::guarded(error, [&] {
-      if (sd_bus_message_has_signature(m, "sa{sv}") <= 0) return 0;
-      const char* name = nullptr;
-      xpc::object payload;
-      if (sd_bus_message_read_basic(m, 's', &name) < 0 || !bus::readDictionary(m, payload))
-        return 0;
-      static_cast<Events*>(userdata)->deliver(name, std::move(payload));
-      return 0;
     });
   }
 };
@@ -88,17 +79,21 @@ void answerFromTraceProperties(const std::string& root, const xpc::object& reque
 class BusManager final : public Manager {
  public:
   BusManager(std::string clientName, dispatch::queue queue)
-      : clientName_(std::move(clientName)), events_(std::make_shared<Events>()) {
+      : clientName_(std::move(clientName)),
+        events_(std::make_shared<Events>()),
+        server_(protocol::kManagerBusName, {[this] { serverLost(); }, [this] { serverGained(); }}) {
     events_->queue = std::move(queue);
     root_ = protocol::platformRoot();
-    Events* events = events_.get();
-    // The match goes out on every new connection before any call, so the
-    // server cannot send an event between Hello's answer and the match.
-    link_ = std::make_unique<bus::BusLink>([events](sd_bus* bus) {
+    // Both subscriptions go out on every new connection before any call, so
+    // no event can slip in between an answer (the owner's, Hello's) and the
+    // subscription. The bus drops broadcasts from anyone but the owner; the
+    // check in onEvent also catches signals addressed to this client alone.
+    link_ = std::make_unique<bus::BusLink>([this](sd_bus* bus) {
       sd_bus_match_signal_async(bus, nullptr, protocol::kManagerBusName,
                                 protocol::kManagerObjectPath, protocol::kManagerInterface,
-                                protocol::kEventSignal, &Events::onSignal,
-                                /* install_callback= */ nullptr, events);
+                                protocol::kEventSignal, &BusManager::onEvent,
+                                /* install_callback= */ nullptr, this);
+      server_.attach(bus);
     });
   }
 
@@ -117,18 +112,7 @@ class BusManager final : public Manager {
       std::lock_guard lock(events_->mutex);
       events_->on = true;
     }
-    std::string client = clientName_;
-    Events* events = events_.get();
-    link_->call(
-        kHello,
-        [client](sd_bus_message* m) { return sd_bus_message_append(m, "s", client.c_str()) >= 0; },
-        bus::callTimeout(25s), [events](const bus::CallOutcome& outcome) {
-          xpc::object state;
-          if (outcome.status != 0 || sd_bus_message_has_signature(outcome.message, "a{sv}") <= 0 ||
-              !bus::readDictionary(outcome.message, state))
-            return;
-          events->deliver(kEventServerStateChange, std::move(state));
-        });
+    sayHello();
   }
 
   TelephonyXPC::Result performCommand(const std::string& command, const xpc::object& request,
@@ -158,6 +142,45 @@ class BusManager final : public Manager {
   }
 
  private:
+  /// Registers with the server and delivers its answer as its state.
+  void sayHello() {
+    std::string client = clientName_;
+    link_->call(
+        kHello,
+        [client](sd_bus_message* m) { return sd_bus_message_append(m, "s", client.c_str()) >= 0; },
+        bus::callTimeout(25s), [this](const bus::CallOutcome& outcome) {
+          xpc::object state;
+          if (outcome.status != 0 || sd_bus_message_has_signature(outcome.message, "a{sv}") <= 0 ||
+              !bus::readDictionary(outcome.message, state))
+            return;
+          events_->deliver(kEventServerStateChange, std::move(state));
+        });
+  }
+
+  /// A server that went away says nothing more: its state is unknown now.
+  void serverLost() { events_->deliver(kEventServerStateChange, xpc::object::dictionary({})); }
+
+  /// A server that took the name over has its own state; ask it as EventsOn does.
+  void serverGained() {
+    if (events_->isOn()) sayHello();
+  }
+
+  /// An Event signal, on the I/O thread. Anyone on the bus may send one, even
+  /// to this client alone; only the server's own connection speaks for it.
+  static int onEvent(sd_bus_message* m, void* userdata, sd_bus_error* error) {
+    return bus::guarded(error, [&] {
+      auto* self = static_cast<BusManager*>(userdata);
+      if (!self->server_.isOwner(sd_bus_message_get_sender(m))) return 0;
+      if (sd_bus_message_has_signature(m, "sa{sv}") <= 0) return 0;
+      const char* name = nullptr;
+      xpc::object payload;
+      if (sd_bus_message_read_basic(m, 's', &name) < 0 || !bus::readDictionary(m, payload))
+        return 0;
+      self->events_->deliver(name, std::move(payload));
+      return 0;
+    });
+  }
+
   void submit(const std::string& command, const xpc::object& request, Done done) {
     std::string client = clientName_;
     auto args = [client, command, request](sd_bus_message* m) {
@@ -181,6 +204,7 @@ class BusManager final : public Manager {
   std::string clientName_;
   std::string root_;
   std::shared_ptr<Events> events_;
+  bus::NameWatch server_;  // I/O thread only
   // Last, so it goes first: its shutdown fails pending calls while the
   // events and the queue are still there.
   std::unique_ptr<bus::BusLink> link_;

@@ -9,6 +9,8 @@
 #include <cstdint>
 #include <filesystem>
 #include <fstream>
+#include <mutex>
+#include <condition_variable>
 #include <optional>
 #include <thread>
 
@@ -40,7 +42,7 @@ object dict(std::vector<xpc::entry> entries) { return object::dictionary(std::mo
 /// handled as `act` says. Answers carry `status`, "client/task/command" as
 /// description and the request as response (for "Foreign": types the mapping
 /// lacks). Hello answers "Started" and the caller's name, then a
-/// ServerStateChange event says "Stopping".
+/// ServerStateChange event says "Stopping"; the peer remembers who said Hello.
 class Peer {
  public:
   enum class Act { answer, wrongSignature, noReply, exit };
@@ -59,6 +61,11 @@ class Peer {
     thread_.join();
     sd_bus_flush_close_unref(bus_);
   }
+  /// The unique name of the last connection that said Hello.
+  std::string caller() const {
+    std::lock_guard lock(mutex_);
+    return caller_;
+  }
 
  private:
   static int onCall(sd_bus_message* m, void* self, sd_bus_error*) {
@@ -72,6 +79,10 @@ class Peer {
     vorn::bus::readDictionary(m, request);
     std::string call = std::string(client) + "/" + std::to_string(task) + "/" + command;
     if (member == "Hello") {
+      {
+        std::lock_guard lock(p->mutex_);
+        p->caller_ = sd_bus_message_get_sender(m);
+      }
       sd_bus_reply_method_return(m, "a{sv}", 2, "ServerState", "s", "Started", "Client", "s", client);
       sd_bus_emit_signal(p->bus_, "/org/vorn/Manager", "org.vorn.Manager1", "Event", "sa{sv}",
                          "ServerStateChange", 1, "ServerState", "s", "Stopping");
@@ -100,6 +111,8 @@ class Peer {
   sd_bus* bus_ = nullptr;
   std::atomic<bool> stop_ = false;
   std::vector<vorn::bus::MessagePtr> unanswered_;  // peer thread only
+  mutable std::mutex mutex_;
+  std::string caller_;
   std::thread thread_;
 };
 using Act = Peer::Act;
@@ -110,6 +123,88 @@ bool drain(const dispatch::queue& q) {
   done.enter();
   q.async([done] { done.leave(); });
   return done.wait(kPatience);
+}
+
+const object kHelloAnswer =
+    dict({{"ServerState", object::string("Started")}, {"Client", object::string("vorntool-test")}});
+const object kStopping = dict({{"ServerState", object::string("Stopping")}});
+
+/// The ServerStateChange payloads that a manager delivers, in order.
+class StateLog {
+ public:
+  explicit StateLog(dispatch::queue queue) : queue_(std::move(queue)) {}
+  void follow(const std::shared_ptr<vorn::client::Manager>& m) {
+    vorn::client::RegisterEventHandler(m, "ServerStateChange",
+                                       [shared = shared_, queue = queue_](object payload, dispatch::group) {
+                                         std::lock_guard lock(shared->mutex);
+                                         shared->onQueue &= queue.isCurrent();
+                                         shared->payloads.push_back(payload);
+                                         shared->changed.notify_all();
+                                       });
+  }
+  /// Waits, within kPatience, until at least `count` payloads came.
+  bool waitFor(std::size_t count) {
+    std::unique_lock lock(shared_->mutex);
+    return shared_->changed.wait_for(lock, kPatience, [&] { return shared_->payloads.size() >= count; });
+  }
+  std::vector<object> payloads() {
+    std::lock_guard lock(shared_->mutex);
+    return shared_->payloads;
+  }
+  bool allOnQueue() {
+    std::lock_guard lock(shared_->mutex);
+    return shared_->onQueue;
+  }
+
+ private:
+  struct Shared {
+    std::mutex mutex;
+    std::condition_variable changed;
+    std::vector<object> payloads;
+    bool onQueue = true;
+  };
+  dispatch::queue queue_;
+  std::shared_ptr<Shared> shared_ = std::make_shared<Shared>();
+};
+
+/// From a connection of its own, which owns nothing: a ServerStateChange event
+/// sent to `client` alone and one to everybody, and a NameOwnerChanged sent to
+/// `client` that says the server's name has lost its owner. Returns once the
+/// bus has passed them on, since it handles one connection's messages in order.
+void spoofFrom(const std::string& client) {
+  sd_bus* raw = nullptr;
+  ASSERT_GE(sd_bus_open_system(&raw), 0);
+  vorn::bus::BusPtr bus(raw);
+  for (const char* destination : {client.c_str(), static_cast<const char*>(nullptr)}) {
+    sd_bus_message* m = nullptr;
+    ASSERT_GE(sd_bus_message_new_signal(raw, &m, "/org/vorn/Manager", "org.vorn.Manager1", "Event"), 0);
+    vorn::bus::MessagePtr event(m);
+    if (destination) {
+      ASSERT_GE(sd_bus_message_set_destination(m, destination), 0);
+    }
+    ASSERT_GE(sd_bus_message_append(m, "sa{sv}", "ServerStateChange", 1, "ServerState", "s", "Spoofed"), 0);
+    ASSERT_GE(sd_bus_send(raw, m, nullptr), 0);
+  }
+  sd_bus_message* m = nullptr;
+  ASSERT_GE(sd_bus_message_new_signal(raw, &m, "/org/freedesktop/DBus", "org.freedesktop.DBus", "NameOwnerChanged"), 0);
+  vorn::bus::MessagePtr ownerChange(m);
+  ASSERT_GE(sd_bus_message_set_destination(m, client.c_str()), 0);
+  ASSERT_GE(sd_bus_message_append(m, "sss", "org.vorn.Manager", client.c_str(), ""), 0);
+  ASSERT_GE(sd_bus_send(raw, m, nullptr), 0);
+  ASSERT_GE(sd_bus_call_method(raw, "org.freedesktop.DBus", "/org/freedesktop/DBus", "org.freedesktop.DBus", "GetId",
+                               nullptr, nullptr, ""),
+            0);
+}
+
+/// Waits, within kPatience, until `name` has no owner on the system bus.
+bool nameGone(const char* name) {
+  sd_bus* raw = nullptr;
+  if (sd_bus_open_system(&raw) < 0) return false;
+  vorn::bus::BusPtr bus(raw);
+  for (auto deadline = std::chrono::steady_clock::now() + kPatience; std::chrono::steady_clock::now() < deadline;
+       std::this_thread::sleep_for(5ms))
+    if (sd_bus_get_name_creds(raw, name, 0, nullptr) < 0) return true;
+  return false;
 }
 
 class ClientOverBus : public ::testing::Test {
@@ -248,24 +343,58 @@ TEST_F(ClientOverBus, RefusesCallersThatThePolicyDenies) {
 
 TEST_F(ClientOverBus, DeliversServerStateOnTheQueue) {
   Peer server(false, Act::answer);
-  std::vector<object> states;  // on the queue only; outlives the manager that fills it
-  bool onQueue = true;
-  dispatch::group twoStates;
-  for (int i = 0; i < 2; ++i) twoStates.enter();
+  StateLog log(queue_);
   auto m = manager();
-  vorn::client::RegisterEventHandler(m, "ServerStateChange", [&](object payload, dispatch::group) {
-    onQueue &= queue_.isCurrent();
-    states.push_back(payload);
-    if (states.size() <= 2) twoStates.leave();
-  });
+  log.follow(m);
   vorn::client::EventsOn(m);
-  ASSERT_TRUE(twoStates.wait(kPatience));
+  ASSERT_TRUE(log.waitFor(2));
   m.reset();
   ASSERT_TRUE(drain(queue_));
-  EXPECT_EQ(states, (std::vector<object>{  // Hello's answer, then the event
-                        dict({{"ServerState", object::string("Started")}, {"Client", object::string("vorntool-test")}}),
-                        dict({{"ServerState", object::string("Stopping")}})}));
-  EXPECT_TRUE(onQueue);
+  EXPECT_EQ(log.payloads(), (std::vector<object>{kHelloAnswer, kStopping}));  // Hello's answer, then the event
+  EXPECT_TRUE(log.allOnQueue());
+}
+
+TEST_F(ClientOverBus, IgnoresEventsFromAnyoneButTheServer) {
+  Peer server(false, Act::answer);
+  StateLog log(queue_);
+  auto m = manager();
+  log.follow(m);
+  vorn::client::EventsOn(m);
+  ASSERT_TRUE(log.waitFor(2));
+  spoofFrom(server.caller());
+  // Hello again: its answer and the server's event come after whatever the
+  // spoofer's signals turned into.
+  vorn::client::EventsOn(m);
+  ASSERT_TRUE(log.waitFor(4));
+  m.reset();
+  ASSERT_TRUE(drain(queue_));
+  EXPECT_EQ(log.payloads(), (std::vector<object>{kHelloAnswer, kStopping, kHelloAnswer, kStopping}));
+}
+
+TEST_F(ClientOverBus, ReportsALostServerOnceAndGreetsTheNextOne) {
+  std::optional<Peer> server;
+  server.emplace(false, Act::answer);
+  StateLog log(queue_);
+  auto m = manager();
+  log.follow(m);
+  vorn::client::EventsOn(m);
+  ASSERT_TRUE(log.waitFor(2));
+  server.reset();  // gone without a word, as after SIGKILL
+  ASSERT_TRUE(log.waitFor(3));
+  server.emplace(false, Act::answer);
+  ASSERT_TRUE(log.waitFor(5));
+
+  // With events off a lost server goes unreported. The call's answer comes
+  // after the owner change on the same connection, so by then it was seen.
+  vorn::client::EventsOff(m);
+  server.reset();
+  ASSERT_TRUE(nameGone("org.vorn.Manager"));
+  object response;
+  EXPECT_EQ(vorn::client::PerformCommand(m, "Echo", dict({}), response).status, kNotRunning);
+  m.reset();
+  ASSERT_TRUE(drain(queue_));
+  EXPECT_EQ(log.payloads(), (std::vector<object>{kHelloAnswer, kStopping, dict({}), kHelloAnswer, kStopping}));
+  EXPECT_TRUE(log.allOnQueue());
 }
 
 TEST_F(ClientOverBus, AnswersTracePropertiesFromTheFileWhileTheServerIsDown) {
