@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: MIT
 #include <gtest/gtest.h>
+#include <unistd.h>
 
 #include <regex>
 
@@ -82,6 +83,85 @@ TEST(VorntoolServerDown, AServerThatStartsLaterIsSeenAtTheNextPrompt) {
   EXPECT_TRUE(matches(r.out, "\\(/vorntool\\)>> \\(/vorntool\\)>> Telephony log collection: Success\nPath = " +
                                  kSnapshot + "log-bb-" + kTs + "-\\*\n\\(/vorntool\\)>> "))
       << r.out;
+}
+
+/// A script that runs an interactive vorntool in the background, fed one line
+/// at a time by `say LINE`; `await N` waits until N prompts are out, that is
+/// until the line before has run, and `problem TEXT` fails the test. After
+/// `body` the input ends; the result holds the session's standard output,
+/// error and exit status (the sandbox's own complaints, such as a killed
+/// daemon's, stay out of it).
+SandboxResult interactiveSession(const std::vector<std::string>& sandboxOptions, const std::string& body) {
+  const std::string separator = "\n--- next ---\n";
+  auto r = runInSandbox(sandboxOptions, R"sh(
+    set -u
+    cd "$VORN_ROOT/.."
+    mkfifo session.in
+    vorntool <session.in >session.out 2>session.err &
+    tool=$!
+    exec 3>session.in
+    say() { printf '%s\n' "$1" >&3; }
+    problem() { printf '%s\n' "$1" >>problems; }
+    await() {
+      for i in $(seq 600); do
+        [ "$(grep -o '(/vorntool)>> ' session.out | wc -l)" -ge "$1" ] && return
+        sleep 0.05
+      done
+      problem "no prompt $1"
+    }
+  )sh" + body + R"sh(
+    exec 3>&-
+    wait "$tool"; status=$?
+    next() { printf '%s' ")sh" + separator + R"sh("; }
+    cat session.out; next; cat session.err; next; cat problems 2>/dev/null; exit "$status"
+  )sh");
+  const auto errAt = r.out.find(separator);
+  const auto problemsAt = r.out.find(separator, errAt == std::string::npos ? 0 : errAt + 1);
+  if (problemsAt == std::string::npos) {
+    ADD_FAILURE() << "the session script did not finish: " << r.out << r.err;
+    return {};
+  }
+  EXPECT_EQ(r.out.substr(problemsAt + separator.size()), "");
+  return {r.status, r.out.substr(0, errAt), r.out.substr(errAt + separator.size(), problemsAt - errAt - separator.size())};
+}
+
+TEST(VorntoolServerTrust, IgnoresServerEventsFromOtherSenders) {
+  if (geteuid() != 0) GTEST_SKIP() << "the spoofer runs as another user, which needs root";
+  auto r = interactiveSession({}, R"sh(
+    await 1; say "logdump tel"; await 2
+    name=$(busctl --system list --unique --no-legend | awk -v pid="$tool" '$2 == pid { print $1 }')
+    chmod 755 .  # lets the spoofer, who may be anybody, reach the bus
+    setpriv --reuid=65534 --regid=65534 --clear-groups )sh" VORN_SPOOF_EVENT R"sh( "$name" Stopping || problem "the spoofer failed"
+    # bb asks the server on the tool's connection: its answers arrive after
+    # the spoofed signals, so they have been read when tel comes.
+    say "logdump bb"
+    say "logdump tel")sh");
+  EXPECT_EQ(r.err, "");
+  EXPECT_TRUE(matches(r.out, "\\(/vorntool\\)>> Telephony log collection: Success\nPath = " + kSnapshot + "log-bb-" + kTs +
+                                 "\\.tar\\.gz\n\\(/vorntool\\)>> Baseband log collection: Success \\(Vorn running\\)\nPath = " +
+                                 kSnapshot + "log-bb-" + kTs +
+                                 "\\.tar\\.gz\n\\(/vorntool\\)>> Telephony log collection: Success\nPath = " + kSnapshot +
+                                 "log-bb-" + kTs + "\\.tar\\.gz\n\\(/vorntool\\)>> "))
+      << r.out;
+  EXPECT_EQ(r.status, 1);  // the end of input ends an interactive session with failure
+}
+
+TEST(VorntoolServerTrust, ASilentlyKilledServerIsSeenAsDown) {
+  auto r = interactiveSession({"--device", "build=customer"}, R"sh(
+    await 1; say "logdump tel"; await 2
+    kill -KILL "$VORN_SANDBOX_VORND_PID"
+    for i in $(seq 200); do busctl --system status org.vorn.Manager >/dev/null 2>&1 || break; sleep 0.05; done
+    busctl --system status org.vorn.Manager >/dev/null 2>&1 && problem "vornd still owns its name"
+    # bb's questions are answered after the bus has told the tool that the
+    # server's name lost its owner.
+    say "logdump bb"
+    say "logdump tel")sh");
+  EXPECT_EQ(r.err, kServerDown);
+  EXPECT_TRUE(matches(r.out, "\\(/vorntool\\)>> Telephony log collection: Success\nPath = " + kSnapshot + "log-bb-" + kTs +
+                                 "\\.tar\\.gz\n\\(/vorntool\\)>> Baseband log collection: Success \\(Vorn not running\\)\n"
+                                 "Path = " + kScratch + "\n\\(/vorntool\\)>> \\(/vorntool\\)>> "))
+      << r.out;
+  EXPECT_EQ(r.status, 1);
 }
 
 TEST(VorntoolStartup, ChecksEndWithStatus255) {
