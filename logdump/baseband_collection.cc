@@ -6,8 +6,6 @@
 #include "logdump/logdump_command.h"
 #include "logdump/logdump_options.h"
 #include "logdump/trace_names.h"
-#include "platform/helper_client.h"
-#include "toolbase/config.h"
 
 namespace {
 
@@ -15,8 +13,8 @@ constexpr std::int64_t kHelperTimeoutMs = 1500;
 
 /// The timestamp of the newest baseband snapshot, from the helper service;
 /// empty when it cannot tell.
-std::string askHelperForSnapshot() {
-  auto helper = vorn::HelperClient::create("logdump.helper", nullptr);
+std::string askHelperForSnapshot(const ToolContext& context) {
+  auto helper = context.helpers ? context.helpers("logdump.helper", nullptr) : nullptr;
   if (!helper) return {};
   xpc::dict response;
   xpc::dict request;
@@ -27,13 +25,13 @@ std::string askHelperForSnapshot() {
   return xpc::dyn_cast_or_default(response.get(vorn::helper::kKeyTimestampString), "");
 }
 
-void reportWithoutServer() {
+void reportWithoutServer(const ToolContext& context) {
   std::string timestamp;
-  if (config::build::internal_or_carrier()) timestamp = askHelperForSnapshot();
+  if (context.device->internalOrCarrier()) timestamp = askHelperForSnapshot(context);
   std::cout << "Baseband log collection: Success (Vorn not running)" << std::endl;
   if (!timestamp.empty())
     std::cout << "Path = " << vorn::trace::kSnapshotFolder << vorn::trace::kLogDirPrefix
-              << timestamp << vorn::trace::getBasebandTraceDirSuffix() << std::endl;
+              << timestamp << context.device->basebandTraceDirSuffix() << std::endl;
   else
     std::cout << "Path = " << vorn::trace::kScratchFolder << diag::config::kDIAGScratchDir
               << std::endl;
@@ -75,14 +73,15 @@ bool collectBasebandLogs(LogdumpCommand& command, std::list<std::string> args) {
   const auto dump = vorn::client::PerformCommand(command.getManager(), vorn::kCommandTraceDumpState,
                                                  request.obj(), response);
   if (dump.status == kResultServerNotRunning) {
-    reportWithoutServer();
+    reportWithoutServer(command.getContext());
   } else if (dump.status != 0) {
     std::cout << "Baseband log collection: Failed" << std::endl;
   } else {
     std::cout << "Baseband log collection: Success (Vorn running)" << std::endl;
     std::cout << "Path = ";
     const std::string timestamp = xpc::dyn_cast_or_default(response.get(vorn::kKeyTimestampString), "");
-    std::cout << getLogArchivePath(timestamp, compression, vorn::trace::getBasebandTraceDirSuffix())
+    std::cout << getLogArchivePath(timestamp, compression,
+                                   command.getContext().device->basebandTraceDirSuffix())
               << std::endl;
   }
   return true;

@@ -14,8 +14,15 @@ std::shared_ptr<LogdumpCommand> LogdumpCommand::create(std::string name,
                                                        std::weak_ptr<CommandBase> parent,
                                                        std::shared_ptr<vorn::client::Manager> manager,
                                                        dispatch::queue queue) {
+  return create(std::move(name), std::move(parent),
+                ToolContext::onThisDevice(std::move(manager), std::move(queue)));
+}
+
+std::shared_ptr<LogdumpCommand> LogdumpCommand::create(std::string name,
+                                                       std::weak_ptr<CommandBase> parent,
+                                                       ToolContext context) {
   std::shared_ptr<LogdumpCommand> command(
-      new LogdumpCommand(std::move(name), std::move(parent), std::move(manager), std::move(queue)));
+      new LogdumpCommand(std::move(name), std::move(parent), std::move(context)));
   command->init();
   return command;
 }

@@ -10,9 +10,12 @@
 /// Everything but "bb" needs a running server.
 class LogdumpCommand : public VornCommandBase {
  public:
+  /// With this machine's device and helper service.
   static std::shared_ptr<LogdumpCommand> create(std::string name, std::weak_ptr<CommandBase> parent,
                                                 std::shared_ptr<vorn::client::Manager> manager,
                                                 dispatch::queue queue);
+  static std::shared_ptr<LogdumpCommand> create(std::string name, std::weak_ptr<CommandBase> parent,
+                                                ToolContext context);
 
   bool isAllowed(std::string name) override;
   void registerCommands() override;

@@ -33,6 +33,7 @@ struct TelephonyCompletion {
   GroupMembership membership;
   CompressionMode compression;
   TelephonyDump kind;
+  std::shared_ptr<DeviceProfile> device;
 
   void operator()(TelephonyXPC::Result result, xpc::object response) const {
     const bool core = kind == TelephonyDump::logsWithCoredump;
@@ -43,7 +44,7 @@ struct TelephonyCompletion {
     const std::string timestamp =
         xpc::dyn_cast_or_default(response.get(vorn::kKeyTimestampString), "");
     std::cout << getLogArchivePath(timestamp, compression,
-                                   core ? vorn::trace::getCoreDumpDirSuffix() : "-*")
+                                   core ? device->coreDumpDirSuffix() : "-*")
               << std::endl;
   }
 };
@@ -62,7 +63,7 @@ bool collectTelephonyLogs(LogdumpCommand& command, dispatch::group group,
   xpc::dict request = buildRequest(kind, reason, compression, noUserConfirmation);
   GroupMembership handlerMembership(group);
   vorn::client::Completion completion =
-      TelephonyCompletion{GroupMembership(group), compression, kind};
+      TelephonyCompletion{GroupMembership(group), compression, kind, command.getContext().device};
   vorn::client::PerformCommand(command.getManager(), vorn::kCommandTraceDumpState,
                                std::move(completion), request.obj());
   return true;

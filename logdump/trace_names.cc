@@ -1,19 +1,15 @@
 // SPDX-License-Identifier: MIT
 #include "logdump/trace_names.h"
 
-#include "platform/device.h"
+#include "toolbase/device_profile.h"
 
 namespace vorn::trace {
 
+// This device's profile fixes each suffix on first use, once per process.
 std::string getBasebandTraceDirSuffix() {
-  // Function statics: built once, thread-safe, and asking the vendor only then.
-  static const std::string suffix = basebandTraceDirSuffix(TelephonyRadiosGetRadioVendor());
-  return suffix;
+  return DeviceProfile::ofThisDevice()->basebandTraceDirSuffix();
 }
 
-std::string getCoreDumpDirSuffix() {
-  static const std::string suffix = coreDumpDirSuffix(TelephonyRadiosGetRadioVendor());
-  return suffix;
-}
+std::string getCoreDumpDirSuffix() { return DeviceProfile::ofThisDevice()->coreDumpDirSuffix(); }
 
 }  // namespace vorn::trace

@@ -11,7 +11,7 @@ namespace platform {
 enum class BuildKind { customer, internal, carrier };
 
 /// The device facts behind the telephony utility calls. The Linux one reads
-/// <root>/etc/vorn/device.conf and /proc; tests install their own.
+/// <root>/etc/vorn/device.conf and /proc; tests describe devices of their own.
 class DeviceInfo {
  public:
   virtual ~DeviceInfo() = default;
@@ -22,9 +22,8 @@ class DeviceInfo {
   virtual bool isProcessRunning(const std::string& name) = 0;
 };
 
-/// Installs the device that the calls below ask; an empty pointer restores the
-/// Linux one.
-void SetDeviceInfo(std::shared_ptr<DeviceInfo> device);
+/// This machine, as the Linux platform sees it; the calls below ask it.
+std::shared_ptr<DeviceInfo> linuxDevice();
 
 }  // namespace platform
 

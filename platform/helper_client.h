@@ -19,17 +19,18 @@ class HelperClient {
  public:
   virtual ~HelperClient() = default;
 
-  /// A client for `clientName`, or an empty pointer when none can be made.
+  /// A client of the helper service over D-Bus for `clientName`, or an empty
+  /// pointer when none can be made.
   static std::shared_ptr<HelperClient> create(const char* clientName,
                                               std::shared_ptr<rilx::LogServer> logServer);
+
+  /// Whatever makes a client as `create` does: `create` itself, or a test's.
+  using Factory = std::function<std::shared_ptr<HelperClient>(
+      const char* clientName, std::shared_ptr<rilx::LogServer> logServer)>;
 
   /// Synchronous; may replace `response`.
   virtual TelephonyXPC::Result perform(helper::TaskID task, const char* command,
                                        xpc::dict request, xpc::dict& response) = 0;
-
-  using Factory = std::function<std::shared_ptr<HelperClient>(const char* clientName)>;
-  /// Installs the factory that `create` uses; an empty one restores D-Bus.
-  static void setFactory(Factory factory);
 };
 
 }  // namespace vorn

@@ -10,8 +10,7 @@
 #include "platform/protocol/protocol.h"
 #include "platform/xpc.h"
 
-/// The server's client library. `CreateManager` connects over D-Bus unless a
-/// test has installed a factory of its own.
+/// The server's client library. `CreateManager` connects over D-Bus.
 namespace vorn::client {
 
 /// Called with the event's payload (possibly null) and a group that the
@@ -41,12 +40,10 @@ class Manager {
                               const xpc::object& request) = 0;
 };
 
+/// Whatever opens a client as `CreateManager` does: `CreateManager` itself, or
+/// a test's.
 using ManagerFactory =
     std::function<std::shared_ptr<Manager>(const std::string& clientName, dispatch::queue queue)>;
-
-/// Installs the factory that `CreateManager` uses; an empty one restores the
-/// D-Bus client.
-void SetManagerFactory(ManagerFactory factory);
 
 std::shared_ptr<Manager> CreateManager(const std::string& clientName, dispatch::queue queue);
 void RegisterEventHandler(std::shared_ptr<Manager> manager, const std::string& eventName,

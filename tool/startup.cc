@@ -11,16 +11,17 @@
 #include "platform/device.h"
 #include "terminal/open_line_reader.h"
 #include "terminal/terminal_facts.h"
-#include "toolbase/config.h"
 #include "tool/vorn_shell.h"
 
-bool passesStartupChecks() {
-  if (TelephonyRadiosGetRadio() == 0) {
+bool passesStartupChecks() { return passesStartupChecks(*DeviceProfile::ofThisDevice()); }
+
+bool passesStartupChecks(const DeviceProfile& device) {
+  if (device.radio() == 0) {
     std::cout << "'vorntool' is not supported on this product." << std::endl;
     return false;
   }
-  if (!config::hw::watch() && !rilx::isProcessRunning("Telhub") &&
-      !rilx::isProcessRunning("modemd")) {
+  if (!device.watch() && !device.isProcessRunning("Telhub") &&
+      !device.isProcessRunning("modemd")) {
     std::cout << "Telhub process is not running. Please run/load Telhub (or modemd) and try again."
               << std::endl;
     return false;

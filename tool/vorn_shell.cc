@@ -4,7 +4,6 @@
 #include <chrono>
 
 #include "platform/device.h"
-#include "platform/vorn_client.h"
 #include "toolbase/server_state.h"
 #include "tool/vorn_command.h"
 
@@ -12,9 +11,14 @@ namespace {
 constexpr auto kServerStateWait = std::chrono::milliseconds(500);
 }
 
+VornShell::VornShell() : VornShell(vorn::client::CreateManager, ToolContext::onThisDevice({}, {})) {}
+
+VornShell::VornShell(vorn::client::ManagerFactory connect, ToolContext base)
+    : connectServer(std::move(connect)), baseContext(std::move(base)) {}
+
 std::shared_ptr<CommandBase> VornShell::createRootCommand() {
   dispatch::queue queue("vorntool.queue");
-  auto manager = vorn::client::CreateManager("vorntool", queue);
+  auto manager = connectServer("vorntool", queue);
 
   dispatch::group group;
   {
@@ -33,5 +37,8 @@ std::shared_ptr<CommandBase> VornShell::createRootCommand() {
   }
   group.wait(kServerStateWait);
 
-  return VornCommand::create(getprogname(), {}, manager, queue);
+  ToolContext context = baseContext;
+  context.manager = manager;
+  context.queue = queue;
+  return VornCommand::create(getprogname(), {}, std::move(context));
 }

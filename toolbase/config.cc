@@ -1,22 +1,12 @@
 // SPDX-License-Identifier: MIT
 #include "toolbase/config.h"
 
-#include <cstdint>
-
-#include "platform/device.h"
+#include "toolbase/device_profile.h"
 
 namespace config {
 
-bool hw::watch() {
-  // Bit n stands for product 58 + n; the unsigned offset puts every code
-  // below 58 far out of range.
-  constexpr std::uint32_t kWatchProducts = 0x7800180F;
-  const std::uint32_t offset = static_cast<std::uint32_t>(TelephonyRadiosGetProduct()) - 58u;
-  return offset <= 30 && ((kWatchProducts >> offset) & 1u) != 0;
-}
+bool hw::watch() { return DeviceProfile::ofThisDevice()->watch(); }
 
-bool build::internal_or_carrier() {
-  return TelephonyUtilIsInternalBuild() || TelephonyUtilIsCarrierBuild();
-}
+bool build::internal_or_carrier() { return DeviceProfile::ofThisDevice()->internalOrCarrier(); }
 
 }  // namespace config

@@ -7,21 +7,25 @@
 #include "framework/command_base.h"
 #include "platform/dispatch.h"
 #include "platform/vorn_client.h"
+#include "toolbase/tool_context.h"
 
-/// A command of the tool: a command node that also holds the server
-/// connection and the tool's queue, both shared by the whole tree.
+/// A command of the tool: a command node that also holds the tool's context
+/// (the server connection, the tool's queue, the device, the helper service),
+/// shared by the whole tree.
 class VornCommandBase : public CommandBase {
  public:
-  const std::shared_ptr<vorn::client::Manager>& getManager() const { return manager; }
-  const dispatch::queue& getQueue() const { return queue; }
+  const std::shared_ptr<vorn::client::Manager>& getManager() const { return context.manager; }
+  const dispatch::queue& getQueue() const { return context.queue; }
+  const ToolContext& getContext() const { return context; }
 
  protected:
+  /// With this machine's device and helper service.
   VornCommandBase(std::string name, std::weak_ptr<CommandBase> parent,
                   std::shared_ptr<vorn::client::Manager> manager, dispatch::queue queue)
-      : CommandBase(std::move(name), std::move(parent)),
-        manager(std::move(manager)),
-        queue(std::move(queue)) {}
+      : VornCommandBase(std::move(name), std::move(parent),
+                        ToolContext::onThisDevice(std::move(manager), std::move(queue))) {}
+  VornCommandBase(std::string name, std::weak_ptr<CommandBase> parent, ToolContext context)
+      : CommandBase(std::move(name), std::move(parent)), context(std::move(context)) {}
 
-  std::shared_ptr<vorn::client::Manager> manager;
-  dispatch::queue queue;
+  ToolContext context;
 };

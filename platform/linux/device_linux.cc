@@ -6,7 +6,6 @@
 #include <unistd.h>
 
 #include <cstring>
-#include <mutex>
 
 #include "platform/device.h"
 #include "platform/linux/device_conf.h"
@@ -78,41 +77,28 @@ class LinuxDevice final : public DeviceInfo {
   }
 };
 
-std::mutex deviceMutex;
-std::shared_ptr<DeviceInfo>& installedDevice() {
-  static std::shared_ptr<DeviceInfo> device;
-  return device;
-}
-
-std::shared_ptr<DeviceInfo> currentDevice() {
-  std::lock_guard lock(deviceMutex);
-  auto& device = installedDevice();
-  if (!device) device = std::make_shared<LinuxDevice>();
-  return device;
-}
-
 }  // namespace
 
-void SetDeviceInfo(std::shared_ptr<DeviceInfo> device) {
-  std::lock_guard lock(deviceMutex);
-  installedDevice() = std::move(device);
+std::shared_ptr<DeviceInfo> linuxDevice() {
+  static const std::shared_ptr<DeviceInfo> device = std::make_shared<LinuxDevice>();
+  return device;
 }
 
 }  // namespace platform
 
-int TelephonyRadiosGetRadio() { return platform::currentDevice()->radio(); }
-int TelephonyRadiosGetProduct() { return platform::currentDevice()->product(); }
-int TelephonyRadiosGetRadioVendor() { return platform::currentDevice()->vendor(); }
+int TelephonyRadiosGetRadio() { return platform::linuxDevice()->radio(); }
+int TelephonyRadiosGetProduct() { return platform::linuxDevice()->product(); }
+int TelephonyRadiosGetRadioVendor() { return platform::linuxDevice()->vendor(); }
 bool TelephonyUtilIsInternalBuild() {
-  return platform::currentDevice()->build() == platform::BuildKind::internal;
+  return platform::linuxDevice()->build() == platform::BuildKind::internal;
 }
 bool TelephonyUtilIsCarrierBuild() {
-  return platform::currentDevice()->build() == platform::BuildKind::carrier;
+  return platform::linuxDevice()->build() == platform::BuildKind::carrier;
 }
 
 namespace rilx {
 bool isProcessRunning(const std::string& processName) {
-  return platform::currentDevice()->isProcessRunning(processName);
+  return platform::linuxDevice()->isProcessRunning(processName);
 }
 }  // namespace rilx
 

@@ -1,7 +1,5 @@
 // SPDX-License-Identifier: MIT
 // vorn::HelperClient over sd-bus.
-#include <mutex>
-
 #include "platform/helper_client.h"
 #include "platform/linux/bus_link.h"
 #include "platform/linux/bus_message.h"
@@ -48,28 +46,11 @@ class BusHelperClient final : public HelperClient {
   bus::BusLink link_;
 };
 
-std::mutex factoryMutex;
-HelperClient::Factory& installedFactory() {
-  static HelperClient::Factory factory;
-  return factory;
-}
-
 }  // namespace
 
 std::shared_ptr<HelperClient> HelperClient::create(const char* clientName,
                                                    std::shared_ptr<rilx::LogServer>) {
-  Factory factory;
-  {
-    std::lock_guard lock(factoryMutex);
-    factory = installedFactory();
-  }
-  if (factory) return factory(clientName);
   return std::make_shared<BusHelperClient>(clientName ? clientName : "");
-}
-
-void HelperClient::setFactory(Factory factory) {
-  std::lock_guard lock(factoryMutex);
-  installedFactory() = std::move(factory);
 }
 
 }  // namespace vorn

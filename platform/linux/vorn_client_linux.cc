@@ -210,26 +210,9 @@ class BusManager final : public Manager {
   std::unique_ptr<bus::BusLink> link_;
 };
 
-std::mutex factoryMutex;
-ManagerFactory& installedFactory() {
-  static ManagerFactory factory;
-  return factory;
-}
-
 }  // namespace
 
-void SetManagerFactory(ManagerFactory factory) {
-  std::lock_guard lock(factoryMutex);
-  installedFactory() = std::move(factory);
-}
-
 std::shared_ptr<Manager> CreateManager(const std::string& clientName, dispatch::queue queue) {
-  ManagerFactory factory;
-  {
-    std::lock_guard lock(factoryMutex);
-    factory = installedFactory();
-  }
-  if (factory) return factory(clientName, std::move(queue));
   return std::make_shared<BusManager>(clientName, std::move(queue));
 }
 

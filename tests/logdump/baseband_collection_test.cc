@@ -45,7 +45,7 @@ TEST_F(BasebandCollection, OutcomeTable) {
     auto fresh = std::make_shared<FakeManager>(queue);
     fresh->answer("GetTraceProperty", c.enabledAnswer, "Baseband");
     fresh->answer("TraceDumpState", c.dump);
-    command = LogdumpCommand::create("logdump", {}, fresh, queue);
+    command = LogdumpCommand::create("logdump", {}, contextWith(fresh));
     auto r = run("bb", c.typed);
     EXPECT_EQ(r.out, c.out) << c.what;
     EXPECT_EQ(r.result, c.result) << c.what;

@@ -24,6 +24,7 @@ TEST_F(LogdumpPermission, OnlyBbRunsWhileTheServerIsDown) {
   StdioCapture io;
   for (const std::string name : {"bb", "tel", "core", "oslog", "BB"}) EXPECT_TRUE(command->isAllowed(name));
   EXPECT_EQ(io.err(), "");
+  gServerRunning = false;  // as the process starts
 }
 
 TEST_F(LogdumpPermission, HelpListsTheFourHandlers) {
@@ -76,35 +77,6 @@ TEST_F(LogdumpOptionWords, OslogWordsSwitchTheListsAfterHistoryAndPath) {
     if (request->imagePaths == std::vector<std::string>{"X"}) lists.insert("images");
   }
   EXPECT_EQ(lists, (std::set<std::string>{"images", "processes"}));
-}
-
-TEST(TraceNames, SuffixesFollowTheVendorSeenFirst) {
-  auto device = std::make_shared<FakeDevice>();
-  device->vendorCode = 2;
-  platform::SetDeviceInfo(device);
-  EXPECT_EQ(vorn::trace::getBasebandTraceDirSuffix(), "-bb-trace");
-  EXPECT_EQ(vorn::trace::getCoreDumpDirSuffix(), "-coredump");
-  device->vendorCode = 0;  // a running process keeps what it saw first
-  EXPECT_EQ(vorn::trace::getBasebandTraceDirSuffix(), "-bb-trace");
-  EXPECT_EQ(vorn::trace::getCoreDumpDirSuffix(), "-coredump");
-  platform::SetDeviceInfo(nullptr);
-}
-
-TEST(TraceNames, OtherVendorsGetTheShortSuffixes) {
-  GTEST_FLAG_SET(death_test_style, "threadsafe");
-  for (int vendor : {0, 1, 3}) {
-    // A fresh process, since the suffixes are fixed once per process.
-    EXPECT_EXIT(
-        {
-          auto device = std::make_shared<FakeDevice>();
-          device->vendorCode = vendor;
-          platform::SetDeviceInfo(device);
-          const bool ok = vorn::trace::getBasebandTraceDirSuffix() == "-diag" &&
-                          vorn::trace::getCoreDumpDirSuffix() == "-cd";
-          std::_Exit(ok ? 0 : 1);
-        },
-        testing::ExitedWithCode(0), "");
-  }
 }
 
 }  // namespace

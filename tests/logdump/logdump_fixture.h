@@ -12,23 +12,20 @@
 #include "logdump/logdump_command.h"
 #include "logdump/trace_names.h"
 #include "toolbase/server_state.h"
+#include "toolbase/tool_context.h"
 
 /// A logdump command wired to a scripted server, device and helper service.
 class LogdumpTest : public testing::Test {
  protected:
-  void SetUp() override {
-    platform::SetDeviceInfo(device);
-    vorn::HelperClient::setFactory([this](const char* client) -> std::shared_ptr<vorn::HelperClient> {
+  /// The fixture's device and helper service, with `server` as the manager.
+  ToolContext contextWith(std::shared_ptr<FakeManager> server) {
+    auto helpers = [this](const char* client, std::shared_ptr<rilx::LogServer>)
+        -> std::shared_ptr<vorn::HelperClient> {
       if (!helperAvailable) return nullptr;
       helper->client = client;
-      return std::shared_ptr<vorn::HelperClient>(helper.get(), [](vorn::HelperClient*) {});
-    });
-    gServerRunning = true;
-  }
-  void TearDown() override {
-    vorn::HelperClient::setFactory(nullptr);
-    platform::SetDeviceInfo(nullptr);
-    gServerRunning = false;
+      return helper;
+    };
+    return {.manager = std::move(server), .queue = queue, .device = profile, .helpers = helpers};
   }
 
   struct Run {
@@ -52,11 +49,12 @@ class LogdumpTest : public testing::Test {
   }
 
   std::shared_ptr<FakeDevice> device = std::make_shared<FakeDevice>();
+  std::shared_ptr<DeviceProfile> profile = std::make_shared<DeviceProfile>(device);
   std::shared_ptr<FakeHelper> helper = std::make_shared<FakeHelper>();
   bool helperAvailable = true;
   dispatch::queue queue{"vorntool.queue"};
   std::shared_ptr<FakeManager> manager = std::make_shared<FakeManager>(queue);
-  std::shared_ptr<LogdumpCommand> command = LogdumpCommand::create("logdump", {}, manager, queue);
+  std::shared_ptr<LogdumpCommand> command = LogdumpCommand::create("logdump", {}, contextWith(manager));
 };
 
 inline const std::string kSnapshot = vorn::trace::kSnapshotFolder;

@@ -48,7 +48,7 @@ TEST_F(TelephonyCollection, RequestsCarryExactlyTheirEntries) {
   for (const auto& c : cases) {
     auto fresh = std::make_shared<FakeManager>(queue);
     fresh->answer("GetTraceProperty", property(c.mode));
-    auto cmd = LogdumpCommand::create("logdump", {}, fresh, queue);
+    auto cmd = LogdumpCommand::create("logdump", {}, contextWith(fresh));
     std::list<std::string> words(c.typed.rbegin(), c.typed.rend());
     StdioCapture io;
     EXPECT_TRUE(cmd->execCommand(c.handler, words));

@@ -3,28 +3,11 @@
 
 #include "../fakes/fake_device.h"
 #include "../framework/stdio_capture.h"
-#include "toolbase/config.h"
 #include "tool/startup.h"
 
 namespace {
 
-class Startup : public testing::Test {
- protected:
-  void SetUp() override { platform::SetDeviceInfo(device); }
-  void TearDown() override { platform::SetDeviceInfo(nullptr); }
-  std::shared_ptr<FakeDevice> device = std::make_shared<FakeDevice>();
-};
-
-TEST_F(Startup, WatchProductsAreExactlyTheListedCodes) {
-  const std::set<int> watches{58, 59, 60, 61, 69, 70, 85, 86, 87, 88};
-  for (int product : {-1, 0, 1, 57, 58, 59, 60, 61, 62, 68, 69, 70, 71, 84, 85, 88, 89, 90, 1000,
-                      58 + 32, 58 + 64, INT32_MIN, INT32_MAX}) {
-    device->productCode = product;
-    EXPECT_EQ(config::hw::watch(), watches.contains(product)) << product;
-  }
-}
-
-TEST_F(Startup, ChecksRadioThenDaemons) {
+TEST(Startup, ChecksRadioThenDaemons) {
   const std::string noRadio = "'vorntool' is not supported on this product.\n";
   const std::string noDaemon =
       "Telhub process is not running. Please run/load Telhub (or modemd) and try again.\n";
@@ -48,13 +31,12 @@ TEST_F(Startup, ChecksRadioThenDaemons) {
       {"any non-zero radio", -3, 57, {}, false, noDaemon, {"Telhub", "modemd"}},
   };
   for (const auto& c : cases) {
-    device = std::make_shared<FakeDevice>();
+    auto device = std::make_shared<FakeDevice>();
     device->radioKind = c.radio;
     device->productCode = c.product;
     device->running = c.running;
-    platform::SetDeviceInfo(device);
     StdioCapture io;
-    EXPECT_EQ(passesStartupChecks(), c.passes) << c.what;
+    EXPECT_EQ(passesStartupChecks(DeviceProfile(device)), c.passes) << c.what;
     EXPECT_EQ(io.out(), c.out) << c.what;
     EXPECT_EQ(io.err(), "") << c.what;
     EXPECT_EQ(device->asked(), c.asked) << c.what;

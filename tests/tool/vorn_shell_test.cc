@@ -6,7 +6,6 @@
 
 #include "../fakes/fake_device.h"
 #include "../fakes/fake_manager.h"
-#include "platform/device.h"
 #include "toolbase/server_state.h"
 #include "toolbase/vorn_command_base.h"
 #include "tool/vorn_shell.h"
@@ -18,20 +17,21 @@ using xpc::object;
 
 class ToolShell : public testing::Test {
  protected:
-  void SetUp() override {
-    gServerRunning = false;
-    vorn::client::SetManagerFactory([this](const std::string& client, dispatch::queue queue) {
+  void SetUp() override { gServerRunning = false; }
+  void TearDown() override {
+    if (manager) manager->releaseHandlers();
+  }
+
+  /// A shell whose server is a FakeManager that reports `state` when asked.
+  VornShell shell() {
+    auto connect = [this](const std::string& client, dispatch::queue queue) {
       clientName = client;
       queueLabel = queue.label();
       manager = std::make_shared<FakeManager>(queue);
       manager->setState(state);
       return manager;
-    });
-  }
-  void TearDown() override {
-    vorn::client::SetManagerFactory(nullptr);
-    if (manager) manager->releaseHandlers();
-    gServerRunning = false;
+    };
+    return VornShell(connect, {.device = device});
   }
 
   /// Waits, with a deadline, until the flag reads `expected`.
@@ -43,6 +43,7 @@ class ToolShell : public testing::Test {
   }
 
   std::optional<object> state;
+  std::shared_ptr<DeviceProfile> device = std::make_shared<DeviceProfile>(std::make_shared<FakeDevice>());
   std::shared_ptr<FakeManager> manager;
   std::string clientName;
   std::string queueLabel;
@@ -51,8 +52,7 @@ class ToolShell : public testing::Test {
 object stateIs(object value) { return object::dictionary({{"ServerState", value}}); }
 
 TEST_F(ToolShell, BuildsTheTreeOnOneConnectionAndQueue) {
-  VornShell shell;
-  auto root = shell.createRootCommand();
+  auto root = shell().createRootCommand();
   ASSERT_TRUE(root);
   EXPECT_EQ(clientName, "vorntool");
   EXPECT_EQ(queueLabel, "vorntool.queue");
@@ -65,13 +65,14 @@ TEST_F(ToolShell, BuildsTheTreeOnOneConnectionAndQueue) {
   auto* base = dynamic_cast<VornCommandBase*>(logdump.get());
   ASSERT_NE(base, nullptr);
   EXPECT_EQ(base->getManager(), manager);
+  EXPECT_EQ(base->getContext().device, device);
+  EXPECT_EQ(base->getQueue().label(), "vorntool.queue");
   EXPECT_EQ(base->getManager(), dynamic_cast<VornCommandBase*>(root.get())->getManager());
 }
 
 TEST_F(ToolShell, StartedStateWithinTheWaitSetsTheFlag) {
   state = stateIs(object::string("Started"));
-  VornShell shell;
-  shell.createRootCommand();
+  shell().createRootCommand();
   EXPECT_TRUE(IsServerRunning());
 }
 
@@ -84,8 +85,7 @@ TEST_F(ToolShell, OnlyTheExactStartedStringSetsTheFlag) {
   };
   for (const auto& payload : payloads) {
     state = stateIs(object::string("Started"));
-    VornShell shell;
-    shell.createRootCommand();
+    shell().createRootCommand();
     ASSERT_TRUE(IsServerRunning());
     manager->emit(payload);
     EXPECT_TRUE(flagBecomes(false));
@@ -94,8 +94,7 @@ TEST_F(ToolShell, OnlyTheExactStartedStringSetsTheFlag) {
 }
 
 TEST_F(ToolShell, AServerThatStartsLaterIsSeenLater) {
-  VornShell shell;
-  auto root = shell.createRootCommand();
+  auto root = shell().createRootCommand();
   EXPECT_FALSE(IsServerRunning());
   manager->emit(stateIs(object::string("Started")));
   EXPECT_TRUE(flagBecomes(true));
