@@ -32,6 +32,9 @@ bool LogdumpCommand::isAllowed(std::string name) {
   if (name == "bb") return true;
   if (IsServerRunning()) return true;
   std::cerr << kServerDownErrorPrint << std::endl;
+  // The server may well be running: the bus would not let the tool ask it.
+  if (getManager() && getManager()->accessDenied())
+    std::cerr << kAccessDeniedErrorPrint << std::endl;
   return false;
 }
 

@@ -22,3 +22,7 @@ inline constexpr const char* kDIAGScratchDir = "DIAG.scratch";
 
 inline constexpr const char* kServerDownErrorPrint =
     "Server is not running. Please try after server starts.";
+
+/// Follows kServerDownErrorPrint when the bus refused the tool access.
+inline constexpr const char* kAccessDeniedErrorPrint =
+    "vorntool: the server refused access; run as root or as a member of group \"vorn\"";

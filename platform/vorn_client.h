@@ -38,6 +38,10 @@ class Manager {
   /// Returns at once; `completion` runs later on the client's queue.
   virtual void performCommand(const std::string& command, Completion completion,
                               const xpc::object& request) = 0;
+  /// True when the bus refused this client's last word with the server (its
+  /// policy admits root and the group "vorn" only) and the server has not
+  /// answered it since. A caller that finds the server silent can say why.
+  virtual bool accessDenied() const = 0;
 };
 
 /// Whatever opens a client as `CreateManager` does: `CreateManager` itself, or

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: MIT
 // vorn::client over sd-bus: one Manager, one connection, one I/O thread;
 // events and asynchronous completions are handed to the Manager's queue.
+#include <atomic>
 #include <map>
 #include <mutex>
 
@@ -115,6 +116,8 @@ class BusManager final : public Manager {
     sayHello();
   }
 
+  bool accessDenied() const override { return denied_; }
+
   TelephonyXPC::Result performCommand(const std::string& command, const xpc::object& request,
                                       xpc::object& response) override {
     auto reply = std::make_shared<bus::SyncReply>();
@@ -149,12 +152,21 @@ class BusManager final : public Manager {
         kHello,
         [client](sd_bus_message* m) { return sd_bus_message_append(m, "s", client.c_str()) >= 0; },
         bus::callTimeout(25s), [this](const bus::CallOutcome& outcome) {
+          noteAccess(outcome.status);
           xpc::object state;
           if (outcome.status != 0 || sd_bus_message_has_signature(outcome.message, "a{sv}") <= 0 ||
               !bus::readDictionary(outcome.message, state))
             return;
           events_->deliver(kEventServerStateChange, std::move(state));
         });
+  }
+
+  /// Remembers whether the bus let the last call through to the server.
+  void noteAccess(std::int32_t status) {
+    if (status == status::kAccessDenied)
+      denied_ = true;
+    else if (status == 0)
+      denied_ = false;
   }
 
   /// A server that went away says nothing more: its state is unknown now.
@@ -187,8 +199,9 @@ class BusManager final : public Manager {
       return sd_bus_message_append(m, "ss", client.c_str(), command.c_str()) >= 0 &&
              bus::appendDictionary(m, request);
     };
-    auto handle = [done = std::move(done), command, request,
+    auto handle = [this, done = std::move(done), command, request,
                    root = root_](const bus::CallOutcome& outcome) {
+      noteAccess(outcome.status);
       if (outcome.status == kResultServerNotRunning && command == kCommandGetTraceProperty)
         return answerFromTraceProperties(root, request, done);
       if (outcome.status != 0) return done({outcome.status, outcome.description}, {});
@@ -205,6 +218,7 @@ class BusManager final : public Manager {
   std::string root_;
   std::shared_ptr<Events> events_;
   bus::NameWatch server_;  // I/O thread only
+  std::atomic<bool> denied_ = false;
   // Last, so it goes first: its shutdown fails pending calls while the
   // events and the queue are still there.
   std::unique_ptr<bus::BusLink> link_;

@@ -329,16 +329,26 @@ INSTANTIATE_TEST_SUITE_P(
     ::testing::Combine(::testing::ValuesIn(kFailures), ::testing::Values(Caller::sync, Caller::async, Caller::helper)),
     [](const auto& info) { return std::string(std::get<0>(info.param).name) + kCallers[int(std::get<1>(info.param))]; });
 
-TEST_F(ClientOverBus, RefusesCallersThatThePolicyDenies) {
+TEST_F(ClientOverBus, RefusesCallersThatThePolicyDeniesAndSaysSo) {
   Peer server(false, Act::answer), helper(true, Act::answer);
   for (const char* mode : {"manager", "helper"}) {
     std::string out = bus_->directory() + "/probe-" + mode;
     vorn::test::ChildProcess probe({{VORN_BUS_PROBE, mode}, {}, /* runAsId= */ 65534, out});
     ASSERT_EQ(probe.wait(kPatience), 0) << mode;
     std::int32_t status = 0;
-    std::ifstream(out) >> status;
+    int deniedBefore = -1, deniedAfter = -1;
+    std::ifstream(out) >> status >> deniedBefore >> deniedAfter;
     EXPECT_EQ(status, kAccessDenied) << mode;
+    if (mode == std::string("manager")) {
+      EXPECT_EQ(deniedBefore, 0);
+      EXPECT_EQ(deniedAfter, 1);
+    }
   }
+  // Root is admitted: nothing to report.
+  auto m = manager();
+  object response;
+  ASSERT_EQ(vorn::client::PerformCommand(m, "Echo", dict({}), response).status, 0);
+  EXPECT_FALSE(m->accessDenied());
 }
 
 TEST_F(ClientOverBus, DeliversServerStateOnTheQueue) {

@@ -164,6 +164,33 @@ TEST(VorntoolServerTrust, ASilentlyKilledServerIsSeenAsDown) {
   EXPECT_EQ(r.status, 1);
 }
 
+TEST(VorntoolAccess, ARefusalSaysWhenTheBusDeniedAccess) {
+  if (geteuid() != 0) GTEST_SKIP() << "runs the tool as another user, which needs root";
+  const std::string denied = "vorntool: the server refused access; run as root or as a member of group \"vorn\"\n";
+  struct Case {
+    std::vector<std::string> options;
+    std::string command;
+    std::string out;
+    std::string err;
+  };
+  const std::vector<Case> cases = {
+      {{}, "logdump tel", "", kServerDown + denied},
+      // No server to be denied: the refusal alone.
+      {{"--no-vornd"}, "logdump tel", "", kServerDown},
+      // Not a refusal: bb fails as on any failed enabled check.
+      {{}, "logdump bb", "Baseband log collection: Failed\n", ""},
+  };
+  for (const auto& c : cases) {
+    // nobody, outside group vorn; the sandbox's folder is root's alone until opened.
+    auto r = runInSandbox(c.options, R"sh(
+      chmod 755 "$VORN_ROOT/.."
+      exec setpriv --reuid=65534 --regid=65534 --clear-groups vorntool )sh" + c.command);
+    EXPECT_EQ(r.status, 1) << c.command;
+    EXPECT_EQ(r.out, c.out) << c.command;
+    EXPECT_EQ(r.err, c.err) << c.command;
+  }
+}
+
 TEST(VorntoolStartup, ChecksEndWithStatus255) {
   struct Case {
     std::vector<std::string> options;

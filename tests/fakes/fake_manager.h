@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: MIT
 #pragma once
 
+#include <atomic>
 #include <map>
 #include <mutex>
 #include <optional>
@@ -26,6 +27,9 @@ class FakeManager : public vorn::client::Manager {
   };
 
   explicit FakeManager(dispatch::queue queue) : queue_(std::move(queue)) {}
+
+  /// What accessDenied() reports.
+  std::atomic<bool> denied = false;
 
   /// Answers `command`, or only GetTraceProperty for trace `traceName`.
   void answer(const std::string& command, Answer a, const std::string& traceName = {}) {
@@ -77,6 +81,7 @@ class FakeManager : public vorn::client::Manager {
     Answer a = record(command, request, /* async= */ true);
     queue_.async([completion, a] { completion({a.status, ""}, a.response); });
   }
+  bool accessDenied() const override { return denied; }
 
  private:
   Answer record(const std::string& command, const xpc::object& request, bool async) {

@@ -27,6 +27,17 @@ TEST_F(LogdumpPermission, OnlyBbRunsWhileTheServerIsDown) {
   gServerRunning = false;  // as the process starts
 }
 
+TEST_F(LogdumpPermission, ARefusalSaysWhenTheBusDeniedAccess) {
+  manager->denied = true;
+  StdioCapture io;
+  EXPECT_TRUE(command->isAllowed("bb"));
+  EXPECT_FALSE(command->isAllowed("tel"));
+  EXPECT_EQ(io.err(),
+            "Server is not running. Please try after server starts.\n"
+            "vorntool: the server refused access; run as root or as a member of group \"vorn\"\n");
+  EXPECT_EQ(io.out(), "");
+}
+
 TEST_F(LogdumpPermission, HelpListsTheFourHandlers) {
   StdioCapture io;
   command->displayHelp();
