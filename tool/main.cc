@@ -5,11 +5,19 @@
 #include <iostream>
 #include <list>
 #include <string>
+#include <string_view>
 
 #include "framework/command_shell.h"
+#include "platform/vorn_version.h"
 #include "tool/startup.h"
 
 int main(int argc, char** argv) {
+  // Answered before the start-up checks: a package manager or a person asks
+  // it on machines where the tool itself would refuse to run.
+  if (argc == 2 && std::string_view(argv[1]) == "--version") {
+    std::cout << "vorntool " << kVornVersion << std::endl;
+    return 0;
+  }
   std::list<std::string> words = CommandShell::convertCmdArgsToList(argc, argv);
   if (!passesStartupChecks()) return -1;
 
