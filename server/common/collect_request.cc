@@ -31,9 +31,29 @@ std::optional<Compression> compressionFrom(const xpc::object& value) {
   }
 }
 
+/// Roughly the bytes `value` takes; stops counting past `limit`.
+size_t weight(const xpc::object& value, size_t limit) {
+  constexpr size_t kScalar = 16;
+  if (const auto* text = value.asString()) return kScalar + text->size();
+  size_t total = kScalar;
+  if (const auto* entries = value.asEntries()) {
+    for (const auto& [key, item] : *entries) {
+      total += key.size() + weight(item, limit);
+      if (total > limit) break;
+    }
+  } else if (const auto* items = value.asArray()) {
+    for (const auto& item : *items) {
+      total += weight(item, limit);
+      if (total > limit) break;
+    }
+  }
+  return total;
+}
+
 }  // namespace
 
 std::optional<CollectRequest> parseCollectRequest(const xpc::object& request) {
+  if (weight(request, kRequestLimit) > kRequestLimit) return std::nullopt;
   const std::string* action = request.get(kKeyTraceAction).asString();
   if (action == nullptr) return std::nullopt;
   auto parsed = actionFromName(*action);
@@ -49,7 +69,7 @@ std::optional<CollectRequest> parseCollectRequest(const xpc::object& request) {
   xpc::object reason = request.get(reasonKey);
   if (reason.isNull()) {
     out.reason = kUnknown;
-  } else if (const auto* text = reason.asString()) {
+  } else if (const auto* text = reason.asString(); text != nullptr && text->size() <= kReasonLimit) {
     out.reason = *text;
   } else {
     return std::nullopt;

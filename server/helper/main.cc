@@ -15,12 +15,17 @@
 int main(int argc, char** argv) {
   using namespace vorn::server;
   HelperOptions options;
-  std::string error;
-  if (!parseHelperOptions(std::vector<std::string>(argv + 1, argv + argc), std::getenv("VORN_ROOT"), &options,
-                          &error)) {
-    std::fprintf(stderr, "vorn-helper: %s\n", error.c_str());
-    return 2;
+  std::string text;
+  switch (parseHelperOptions(std::vector<std::string>(argv + 1, argv + argc), std::getenv("VORN_ROOT"), &options,
+                             &text)) {
+    case OptionsVerdict::run: break;
+    case OptionsVerdict::help:
+    case OptionsVerdict::version: std::fputs(text.c_str(), stdout); return 0;
+    case OptionsVerdict::error:
+      std::fprintf(stderr, "vorn-helper: %s (see vorn-helper --help)\n", text.c_str());
+      return 2;
   }
+  std::string error;
   signal(SIGPIPE, SIG_IGN);
   DaemonLoop loop;
   HelperService* service = nullptr;

@@ -8,7 +8,7 @@
 
 namespace vorn::server {
 
-CollectionWorker::CollectionWorker(DaemonLoop& loop, Collector& collector) : loop_(loop), collector_(collector) {}
+CollectionWorker::CollectionWorker(DaemonLoop& loop, Collect collect) : loop_(loop), collect_(std::move(collect)) {}
 
 CollectionWorker::~CollectionWorker() {
   stop();
@@ -22,13 +22,16 @@ bool CollectionWorker::start() {
   sd_event_source* src = nullptr;
   if (sd_event_add_io(loop_.event(), &src, wakeFd_, EPOLLIN, &CollectionWorker::onWake, this) < 0) return false;
   wakeSource_.reset(src);
-  thread_ = std::thread([this] { run(); });
+  thread_ = std::thread([this] { loop(); });
   return true;
 }
 
-void CollectionWorker::submit(const CollectRequest& request, Done done) {
-  std::lock_guard lock(mutex_);
-  queued_.push_back(Job{request, std::move(done), {}});
+void CollectionWorker::run(const CollectRequest& request, Done done) {
+  busy_ = true;
+  {
+    std::lock_guard lock(mutex_);
+    next_ = Job{request, std::move(done), {}};
+  }
   cv_.notify_one();
 }
 
@@ -36,35 +39,33 @@ void CollectionWorker::stop() {
   {
     std::lock_guard lock(mutex_);
     quit_ = true;
-    queued_.clear();
+    next_.reset();
   }
   cancel_ = true;
   cv_.notify_one();
   if (thread_.joinable()) thread_.join();
 }
 
-void CollectionWorker::run() {
+void CollectionWorker::loop() {
   for (;;) {
     Job job;
     {
       std::unique_lock lock(mutex_);
-      cv_.wait(lock, [this] { return quit_ || !queued_.empty(); });
+      cv_.wait(lock, [this] { return quit_ || next_.has_value(); });
       if (quit_) return;
-      job = std::move(queued_.front());
-      queued_.pop_front();
+      job = std::move(*next_);
+      next_.reset();
     }
     try {
-      job.outcome = collector_.collect(job.request, cancel_);
+      job.outcome = collect_(job.request, cancel_);
     } catch (const std::exception& e) {
       job.outcome = CollectOutcome{false, {}, e.what()};
     }
     {
       std::lock_guard lock(mutex_);
-      finished_.push_back(std::move(job));
+      finished_ = std::move(job);
     }
     std::uint64_t one = 1;
-    // The loop drains every finished job per wake-up, so a lost increment
-    // (counter full) cannot strand one.
     [[maybe_unused]] auto n = ::write(wakeFd_, &one, sizeof one);
   }
 }
@@ -73,18 +74,19 @@ int CollectionWorker::onWake(sd_event_source*, int fd, uint32_t, void* userdata)
   auto* self = static_cast<CollectionWorker*>(userdata);
   std::uint64_t count = 0;
   [[maybe_unused]] auto n = ::read(fd, &count, sizeof count);
-  std::deque<Job> done;
+  std::optional<Job> done;
   {
     std::lock_guard lock(self->mutex_);
     done.swap(self->finished_);
   }
-  for (auto& job : done) {
-    try {
-      job.done(job.outcome);
-    } catch (...) {
-      // One caller's failed answer must not strand the others.
-    }
+  if (!done) return 0;
+  self->busy_ = false;
+  try {
+    done->done(done->outcome);
+  } catch (...) {
+    // A failed answer must not stop the line.
   }
+  if (self->onFree) self->onFree();
   return 0;
 }
 

@@ -3,25 +3,27 @@
 
 #include <atomic>
 #include <condition_variable>
-#include <deque>
 #include <functional>
 #include <mutex>
+#include <optional>
 #include <thread>
 
 #include "server/common/collector.h"
 #include "server/common/daemon_loop.h"
 
-/// Runs collections one at a time on a thread of its own, so that the bus
-/// loop keeps answering (Hello, property queries) during a long one. A
-/// request that arrives meanwhile waits in line. Completions run on the
-/// loop's thread, which alone touches the bus.
+/// Runs one collection at a time on a thread of its own, so that the bus
+/// loop keeps answering (Hello, property queries) during a long one. Which
+/// collection runs next is the loop's business (see collection_line.h):
+/// the worker takes one job, and tells the loop when it is free again.
+/// Completions run on the loop's thread, which alone touches the bus.
 namespace vorn::server {
 
 class CollectionWorker {
  public:
+  using Collect = std::function<CollectOutcome(const CollectRequest&, const std::atomic<bool>& cancel)>;
   using Done = std::function<void(const CollectOutcome&)>;
 
-  CollectionWorker(DaemonLoop& loop, Collector& collector);
+  CollectionWorker(DaemonLoop& loop, Collect collect);
   ~CollectionWorker();
   CollectionWorker(const CollectionWorker&) = delete;
   CollectionWorker& operator=(const CollectionWorker&) = delete;
@@ -30,10 +32,14 @@ class CollectionWorker {
   /// the wake-up channel cannot be made.
   bool start();
 
-  /// Queues a collection; `done` runs on the loop thread when it ends.
-  void submit(const CollectRequest& request, Done done);
+  /// Loop thread: true from `run` until the completion has run.
+  bool busy() const { return busy_; }
+  /// Loop thread: starts a collection; only when not busy. `done` runs on
+  /// the loop thread when it ends, then `onFree`.
+  void run(const CollectRequest& request, Done done);
+  std::function<void()> onFree;
 
-  /// Cancels the running collection, drops the queued ones and joins.
+  /// Cancels the running collection and joins the thread.
   void stop();
 
  private:
@@ -43,18 +49,20 @@ class CollectionWorker {
     CollectOutcome outcome;
   };
 
-  void run();
+  void loop();
   static int onWake(sd_event_source* s, int fd, uint32_t revents, void* userdata);
 
   DaemonLoop& loop_;
-  Collector& collector_;
+  Collect collect_;
   int wakeFd_ = -1;
   bus::EventSourcePtr wakeSource_;
   std::thread thread_;
+  bool busy_ = false;  // loop thread only
+
   std::mutex mutex_;
   std::condition_variable cv_;
-  std::deque<Job> queued_;
-  std::deque<Job> finished_;
+  std::optional<Job> next_;
+  std::optional<Job> finished_;
   bool quit_ = false;
   std::atomic<bool> cancel_{false};
 };

@@ -18,8 +18,8 @@ xpc::object stateDict(const std::string& state) {
 }  // namespace
 
 ManagerService::ManagerService(const ManagerOptions& options, DaemonLoop& loop, TraceProperties properties,
-                               CollectionWorker& worker)
-    : options_(options), loop_(loop), properties_(std::move(properties)), worker_(worker) {}
+                               CollectionLine& line)
+    : options_(options), loop_(loop), properties_(std::move(properties)), line_(line) {}
 
 bool ManagerService::start(std::string* error) {
   static const sd_bus_vtable kVtable[] = {
@@ -82,8 +82,10 @@ int ManagerService::hello(sd_bus_message* m, sd_bus_error*) {
   const char* client = nullptr;
   int r = sd_bus_message_read_basic(m, 's', &client);
   if (r < 0) return r;
+#ifdef VORN_TEST_SWITCHES
   if (options_.exitOn.count(protocol::kHelloMethod)) _exit(0);
   if (options_.noReply.count(protocol::kHelloMethod)) return 1;
+#endif
   sd_bus_message* raw = nullptr;
   if ((r = sd_bus_message_new_method_return(m, &raw)) < 0) return r;
   bus::MessagePtr answer(raw);
@@ -112,13 +114,15 @@ int ManagerService::performCommand(sd_bus_message* m, sd_bus_error*) {
   return 1;
 }
 
-bool ManagerService::misbehave(sd_bus_message* call, const std::string& command) {
+bool ManagerService::misbehave([[maybe_unused]] sd_bus_message* call, [[maybe_unused]] const std::string& command) {
+#ifdef VORN_TEST_SWITCHES
   if (options_.exitOn.count(command)) _exit(0);
   if (options_.noReply.count(command)) return true;
   if (auto it = options_.fail.find(command); it != options_.fail.end()) {
     reply(call, {it->second, "failing " + command + " on purpose", {}});
     return true;
   }
+#endif
   return false;
 }
 
@@ -136,11 +140,14 @@ ManagerService::Answer ManagerService::getTraceProperty(const xpc::object& reque
 void ManagerService::traceDumpState(sd_bus_message* call, const xpc::object& request) {
   auto parsed = parseCollectRequest(request);
   if (!parsed) {
-    reply(call, {status::kBadRequest, "TraceDumpState needs a collect action and a compression of 0, 1 or 2", {}});
+    reply(call, {status::kBadRequest,
+                 "TraceDumpState needs a collect action, a compression of 0, 1 or 2 and a reason of at most " +
+                     std::to_string(kReasonLimit) + " bytes",
+                 {}});
     return;
   }
   auto held = std::make_shared<bus::MessagePtr>(bus::retain(call));
-  worker_.submit(*parsed, [this, held](const CollectOutcome& outcome) {
+  const bool taken = line_.submit(call, *parsed, [this, held](const CollectOutcome& outcome) {
     if (outcome.ok) {
       reply(held->get(),
             {0, "", xpc::object::dictionary({{kKeyTimestampString, xpc::object::string(outcome.timestamp)}})});
@@ -148,6 +155,10 @@ void ManagerService::traceDumpState(sd_bus_message* call, const xpc::object& req
       reply(held->get(), {status::kCollectionFailed, "collection failed: " + outcome.error, {}});
     }
   });
+  if (!taken) {
+    reply(call, {status::kBusy,
+                 "busy: a collection is running and " + std::to_string(CollectionLine::kMaxWaiting) + " wait", {}});
+  }
 }
 
 void ManagerService::reply(sd_bus_message* call, const Answer& answer) {

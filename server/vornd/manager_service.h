@@ -8,7 +8,7 @@
 #include "server/common/daemon_loop.h"
 #include "server/common/daemon_options.h"
 #include "server/common/trace_properties.h"
-#include "server/vornd/collection_worker.h"
+#include "server/vornd/collection_line.h"
 
 /// The server's bus object: org.vorn.Manager1 at /org/vorn/Manager.
 namespace vorn::server {
@@ -16,7 +16,7 @@ namespace vorn::server {
 class ManagerService {
  public:
   ManagerService(const ManagerOptions& options, DaemonLoop& loop, TraceProperties properties,
-                 CollectionWorker& worker);
+                 CollectionLine& line);
 
   /// Publishes the object and takes the name; the state is "Starting" until
   /// `announce` runs (now, or after --start-delay-ms).
@@ -42,14 +42,14 @@ class ManagerService {
 
   void announce(const std::string& state);
   void reply(sd_bus_message* call, const Answer& answer);
-  /// True when the test switches took this command over (answered it,
-  /// dropped it or ended the process).
+  /// True when the test switches (testing builds only) took this command
+  /// over: answered it, dropped it or ended the process.
   bool misbehave(sd_bus_message* call, const std::string& command);
 
   const ManagerOptions& options_;
   DaemonLoop& loop_;
   TraceProperties properties_;
-  CollectionWorker& worker_;
+  CollectionLine& line_;
   bus::SlotPtr slot_;
   std::string state_ = "Starting";
 };

@@ -8,6 +8,7 @@
 #include <functional>
 #include <list>
 #include <optional>
+#include <random>
 #include <set>
 
 #include "platform/protocol/protocol.h"
@@ -37,6 +38,13 @@ object collect(const char* action, std::optional<int> compression) {
                                      {"TraceDumpStateReason", object::string("e2e")}};
   if (compression) entries.push_back({"TraceDumpStatePerformCompression", object::int64(*compression)});
   return dict(std::move(entries));
+}
+
+std::string noise(size_t size) {
+  std::mt19937 random(7);
+  std::string out(size, '\0');
+  for (auto& c : out) c = static_cast<char>(random());
+  return out;
 }
 
 std::set<std::string> namesIn(const fs::path& dir) {
@@ -174,7 +182,8 @@ INSTANTIATE_TEST_SUITE_P(
     Daemons, FailedCollection,
     ::testing::Values(
         Failure{"UnreadableSource", "var/log/vorn", "a file where a folder belongs", {VORND_PATH}},
-        // A file-size limit fails writes the way a full disk does.
-        Failure{"NoRoom", "var/lib/vorn/modem/ram.bin", std::string(1 << 20, 'x'),
+        // A file-size limit fails writes the way a full disk does; the data
+        // must not compress below it.
+        Failure{"NoRoom", "var/lib/vorn/modem/ram.bin", noise(1 << 20),
                 {"/bin/sh", "-c", "ulimit -f 256 && exec \"$0\" \"$@\"", VORND_PATH}}),
     [](const auto& info) { return std::string(info.param.label); });

@@ -1,0 +1,36 @@
+// SPDX-License-Identifier: MIT
+#include "server/common/output_policy.h"
+
+#include <grp.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstring>
+#include <vector>
+
+namespace vorn::server {
+
+std::optional<gid_t> outputGroup() {
+  struct group entry {};
+  struct group* found = nullptr;
+  std::vector<char> buffer(16 * 1024);
+  // getgrnam is not thread-safe, and collections run on a thread of their own.
+  if (getgrnam_r("vorn", &entry, buffer.data(), buffer.size(), &found) != 0 || found == nullptr) return std::nullopt;
+  return found->gr_gid;
+}
+
+bool applyOutputPolicy(int fd, mode_t mode, std::optional<gid_t> group, const std::string& what,
+                       std::string* error) {
+  if (group && ::fchown(fd, static_cast<uid_t>(-1), *group) != 0) {
+    *error = "cannot give " + what + " to the group vorn: " + std::strerror(errno);
+    return false;
+  }
+  // After the chown, which may clear set-id bits but never adds any.
+  if (::fchmod(fd, mode) != 0) {
+    *error = "cannot set the mode of " + what + ": " + std::strerror(errno);
+    return false;
+  }
+  return true;
+}
+
+}  // namespace vorn::server
