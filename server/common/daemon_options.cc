@@ -18,6 +18,7 @@ namespace {
 /// but --help and --version takes one).
 struct Option {
   const char* name;
+  const char* value;  // how --help names the value
   const char* usage;
   std::function<bool(const std::string& value, std::string* error)> take;
 };
@@ -45,9 +46,12 @@ std::string defaultRoot(const char* envRoot) { return envRoot != nullptr && *env
 
 std::string usage(const char* program, const std::vector<Option>& options) {
   std::string text = std::string("Usage: ") + program + " [OPTION]...\n";
-  for (const auto& o : options) text += "  --" + std::string(o.name) + " " + o.usage + "\n";
-  text += "  --help             show this help and exit\n";
-  text += "  --version          show the version and exit\n";
+  auto line = [&](const std::string& option, const char* usage) {
+    text += "  " + option + std::string(option.size() < 32 ? 32 - option.size() : 1, ' ') + usage + "\n";
+  };
+  for (const auto& o : options) line("--" + std::string(o.name) + " " + o.value, o.usage);
+  line("--help", "show this help and exit");
+  line("--version", "show the version and exit");
   return text;
 }
 
@@ -109,8 +113,8 @@ OptionsVerdict parseManagerOptions(const std::vector<std::string>& args, const c
   ManagerOptions opts;
   opts.root = defaultRoot(envRoot);
   std::vector<Option> options = {
-      {"root", "DIR         the platform root (default: $VORN_ROOT, else /)", rootInto(&opts.root)},
-      {"max-collection-bytes", "N  data bytes one collection stores at most (default 1 GiB)",
+      {"root", "DIR", "the platform root (default: $VORN_ROOT, else /)", rootInto(&opts.root)},
+      {"max-collection-bytes", "N", "data bytes one collection stores at most (default 1 GiB)",
        [&](const std::string& v, std::string* e) {
          std::uint64_t n = 0;
          auto [end, ec] = std::from_chars(v.data(), v.data() + v.size(), n);
@@ -122,14 +126,14 @@ OptionsVerdict parseManagerOptions(const std::vector<std::string>& args, const c
          return false;
        }},
 #ifdef VORN_TEST_SWITCHES
-      {"state", "TEXT       report this state instead of Started",
+      {"state", "TEXT", "report this state instead of Started",
        [&](const std::string& v, std::string*) { opts.state = v; return true; }},
-      {"start-delay-ms", "N  announce the state N ms after taking the name",
+      {"start-delay-ms", "N", "announce the state N ms after taking the name",
        delayInto(&opts.startDelayMs, "--start-delay-ms")},
-      {"reply-delay-ms", "N  delay every answer by N ms", delayInto(&opts.replyDelayMs, "--reply-delay-ms")},
-      {"collect-delay-ms", "N  hold each collection N ms before it starts",
+      {"reply-delay-ms", "N", "delay every answer by N ms", delayInto(&opts.replyDelayMs, "--reply-delay-ms")},
+      {"collect-delay-ms", "N", "hold each collection N ms before it starts",
        delayInto(&opts.collectDelayMs, "--collect-delay-ms")},
-      {"fail", "COMMAND=STATUS  answer COMMAND with STATUS",
+      {"fail", "COMMAND=STATUS", "answer COMMAND with STATUS",
        [&](const std::string& v, std::string* e) {
          auto eq = v.rfind('=');
          int status = 0;
@@ -140,9 +144,9 @@ OptionsVerdict parseManagerOptions(const std::vector<std::string>& args, const c
          opts.fail[v.substr(0, eq)] = status;
          return true;
        }},
-      {"no-reply", "COMMAND  never answer COMMAND",
+      {"no-reply", "COMMAND", "never answer COMMAND",
        [&](const std::string& v, std::string*) { opts.noReply.insert(v); return true; }},
-      {"exit-on", "COMMAND   exit at once when COMMAND arrives",
+      {"exit-on", "COMMAND", "exit at once when COMMAND arrives",
        [&](const std::string& v, std::string*) { opts.exitOn.insert(v); return true; }},
 #endif
   };
@@ -156,10 +160,10 @@ OptionsVerdict parseHelperOptions(const std::vector<std::string>& args, const ch
   HelperOptions opts;
   opts.root = defaultRoot(envRoot);
   std::vector<Option> options = {
-      {"root", "DIR         the platform root (default: $VORN_ROOT, else /)", rootInto(&opts.root)},
+      {"root", "DIR", "the platform root (default: $VORN_ROOT, else /)", rootInto(&opts.root)},
 #ifdef VORN_TEST_SWITCHES
-      {"reply-delay-ms", "N  delay every answer by N ms", delayInto(&opts.replyDelayMs, "--reply-delay-ms")},
-      {"fail", "STATUS     answer every request with STATUS",
+      {"reply-delay-ms", "N", "delay every answer by N ms", delayInto(&opts.replyDelayMs, "--reply-delay-ms")},
+      {"fail", "STATUS", "answer every request with STATUS",
        [&](const std::string& v, std::string* e) {
          int status = 0;
          if (!parseStatus(v, &status)) {
