@@ -131,6 +131,8 @@ bool ArchiveSink::header(const std::string& name, mode_t type, mode_t perm, off_
   archive_entry_set_gname(entry.get(), "root");
   if (sparse != nullptr) {
     for (const auto& e : *sparse) archive_entry_sparse_add_entry(entry.get(), e.offset, e.length);
+    // A file that is all hole still needs a map: one empty block at its end.
+    if (sparse->empty()) archive_entry_sparse_add_entry(entry.get(), size, 0);
   }
   // A warning means a name went in as bytes, which is what we want.
   if (archive_write_header(archive_, entry.get()) < ARCHIVE_WARN) {

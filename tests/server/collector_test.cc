@@ -237,6 +237,8 @@ TEST_P(CollectionForms, SparseFilesAreStoredByWhatTheyHold) {
     ASSERT_EQ(::pwrite(fd, "hello", 5, kGiB), 5);
     ::close(fd);
   }
+  write(logs() / "hole.bin", "");
+  ASSERT_EQ(::truncate((logs() / "hole.bin").c_str(), kGiB), 0);
   auto outcome = collect(GetParam().compression);
   ASSERT_TRUE(outcome.ok) << outcome.error;
   if (GetParam().compression != Compression::none) {
@@ -246,6 +248,8 @@ TEST_P(CollectionForms, SparseFilesAreStoredByWhatTheyHold) {
   const CollectedItem& item = found[path("vorn/sparse.bin")];
   EXPECT_EQ(item.size, 2 * kGiB);
   EXPECT_LT(item.stored, 1 << 20);
+  EXPECT_EQ(found[path("vorn/hole.bin")].size, kGiB);
+  EXPECT_EQ(found[path("vorn/hole.bin")].stored, 0);
   if (GetParam().compression == Compression::none) {
     char back[5] = {};
     int fd = ::open((output_ / "vorn/sparse.bin").c_str(), O_RDONLY);
