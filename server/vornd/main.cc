@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: MIT
 // vornd: the reference Vorn server. Owns org.vorn.Manager on the system bus
 // and collects logs under its platform root.
+#include <malloc.h>
 #include <signal.h>
 
 #include <chrono>
@@ -44,6 +45,10 @@ int main(int argc, char** argv) {
     case OptionsVerdict::version: std::fputs(text.c_str(), stdout); return 0;
     case OptionsVerdict::error: std::fprintf(stderr, "vornd: %s (see vornd --help)\n", text.c_str()); return 2;
   }
+  // A refused request may be tens of megabytes; with a fixed threshold such
+  // buffers are mapped and unmapped, rather than raising glibc's moving one
+  // and staying in the heap for good.
+  mallopt(M_MMAP_THRESHOLD, 4 << 20);
   // A full disk or a file-size limit must fail a collection, not kill us.
   signal(SIGXFSZ, SIG_IGN);
   signal(SIGPIPE, SIG_IGN);
