@@ -1,123 +1,103 @@
 // SPDX-License-Identifier: MIT
 #include "platform/logstore/unicode_fold.h"
 
+#include <utf8proc.h>
+
 #include <algorithm>
-#include <cstdint>
+#include <vector>
 
 namespace logstore {
 namespace {
 
-struct CodeRange {
-  char32_t first;
-  char32_t last;
-};
-struct SingleFold {
-  char32_t from;
-  char32_t to;
-};
-struct MultiFold {
-  char32_t from;
-  char32_t to[3];  // zero-padded
-};
+using CodePoint = utf8proc_int32_t;
 
-#include "platform/logstore/unicode_fold_table.inc"
+constexpr CodePoint kReplacement = 0xFFFD;
+constexpr auto kFoldOptions = static_cast<utf8proc_option_t>(UTF8PROC_DECOMPOSE | UTF8PROC_CASEFOLD);
 
-constexpr char32_t kReplacement = 0xFFFD;
+// Hangul syllable arithmetic: a syllable is L + V (+ T) conjoining letters.
+constexpr CodePoint kSyllableBase = 0xAC00, kLeadBase = 0x1100, kVowelBase = 0x1161, kTrailBase = 0x11A7;
+constexpr CodePoint kLeadCount = 19, kVowelCount = 21, kTrailCount = 28;
+constexpr CodePoint kSyllableCount = kLeadCount * kVowelCount * kTrailCount;
 
-/// Decodes one UTF-8 sequence at `s[i]`, advancing `i`; malformed input
-/// (overlong forms, surrogates, values past U+10FFFF, truncation) yields
-/// U+FFFD and consumes one byte.
-char32_t decode(std::string_view s, std::size_t& i) {
-  const auto b0 = static_cast<unsigned char>(s[i]);
-  if (b0 < 0x80) {
-    ++i;
-    return b0;
+int combiningClass(CodePoint cp) { return utf8proc_get_property(cp)->combining_class; }
+
+/// Appends the case-folded canonical decomposition of `cp` to `out`, without
+/// its nonspacing marks. Other marks (spacing, enclosing) stay: they change
+/// the letter rather than decorate it.
+void appendFolded(CodePoint cp, std::vector<CodePoint>& out) {
+  constexpr utf8proc_ssize_t kRoom = 8;  // more than any decomposition needs
+  const std::size_t at = out.size();
+  out.resize(at + kRoom);
+  int boundClass = 0;
+  utf8proc_ssize_t n = utf8proc_decompose_char(cp, out.data() + at, kRoom, kFoldOptions, &boundClass);
+  if (n > kRoom) {
+    out.resize(at + static_cast<std::size_t>(n));
+    n = utf8proc_decompose_char(cp, out.data() + at, n, kFoldOptions, &boundClass);
   }
-  int len;
-  char32_t cp;
-  char32_t min;
-  if ((b0 & 0xE0) == 0xC0) {
-    len = 2, cp = b0 & 0x1F, min = 0x80;
-  } else if ((b0 & 0xF0) == 0xE0) {
-    len = 3, cp = b0 & 0x0F, min = 0x800;
-  } else if ((b0 & 0xF8) == 0xF0) {
-    len = 4, cp = b0 & 0x07, min = 0x10000;
-  } else {
-    ++i;
-    return kReplacement;
+  out.resize(at + static_cast<std::size_t>(std::max<utf8proc_ssize_t>(n, 0)));
+  out.erase(std::remove_if(out.begin() + static_cast<std::ptrdiff_t>(at), out.end(),
+                           [](CodePoint c) { return utf8proc_category(c) == UTF8PROC_CATEGORY_MN; }),
+            out.end());
+}
+
+/// Puts each run of combining marks in canonical order. Done after the
+/// nonspacing marks are gone, because their removal can join two runs.
+void orderMarks(std::vector<CodePoint>& cps) {
+  auto starter = [](CodePoint c) { return combiningClass(c) == 0; };
+  for (auto it = std::find_if_not(cps.begin(), cps.end(), starter); it != cps.end();
+       it = std::find_if_not(it, cps.end(), starter)) {
+    auto end = std::find_if(it, cps.end(), starter);
+    std::stable_sort(it, end, [](CodePoint a, CodePoint b) { return combiningClass(a) < combiningClass(b); });
+    it = end;
   }
-  if (i + len > s.size()) {
-    ++i;
-    return kReplacement;
-  }
-  for (int k = 1; k < len; ++k) {
-    const auto b = static_cast<unsigned char>(s[i + k]);
-    if ((b & 0xC0) != 0x80) {
-      ++i;
-      return kReplacement;
+}
+
+/// Joins conjoining Hangul letters back into syllables, so that a fragment
+/// never matches part of a syllable, and a syllable typed as letters matches
+/// the precomposed one.
+void composeSyllables(std::vector<CodePoint>& cps) {
+  std::size_t w = 0;
+  for (CodePoint cp : cps) {
+    if (w > 0) {
+      CodePoint& last = cps[w - 1];
+      const CodePoint lead = last - kLeadBase, vowel = cp - kVowelBase;
+      if (lead >= 0 && lead < kLeadCount && vowel >= 0 && vowel < kVowelCount) {
+        last = kSyllableBase + (lead * kVowelCount + vowel) * kTrailCount;
+        continue;
+      }
+      const CodePoint syllable = last - kSyllableBase, trail = cp - kTrailBase;
+      if (syllable >= 0 && syllable < kSyllableCount && syllable % kTrailCount == 0 && trail > 0 &&
+          trail < kTrailCount) {
+        last += trail;
+        continue;
+      }
     }
-    cp = (cp << 6) | (b & 0x3F);
+    cps[w++] = cp;
   }
-  if (cp < min || cp > 0x10FFFF || (cp >= 0xD800 && cp < 0xE000)) {
-    ++i;
-    return kReplacement;
-  }
-  i += len;
-  return cp;
-}
-
-void encode(char32_t cp, std::string& out) {
-  if (cp < 0x80) {
-    out.push_back(static_cast<char>(cp));
-  } else if (cp < 0x800) {
-    out.push_back(static_cast<char>(0xC0 | (cp >> 6)));
-    out.push_back(static_cast<char>(0x80 | (cp & 0x3F)));
-  } else if (cp < 0x10000) {
-    out.push_back(static_cast<char>(0xE0 | (cp >> 12)));
-    out.push_back(static_cast<char>(0x80 | ((cp >> 6) & 0x3F)));
-    out.push_back(static_cast<char>(0x80 | (cp & 0x3F)));
-  } else {
-    out.push_back(static_cast<char>(0xF0 | (cp >> 18)));
-    out.push_back(static_cast<char>(0x80 | ((cp >> 12) & 0x3F)));
-    out.push_back(static_cast<char>(0x80 | ((cp >> 6) & 0x3F)));
-    out.push_back(static_cast<char>(0x80 | (cp & 0x3F)));
-  }
-}
-
-bool isMark(char32_t cp) {
-  auto it = std::upper_bound(std::begin(kMarkRanges), std::end(kMarkRanges), cp,
-                             [](char32_t c, const CodeRange& r) { return c < r.first; });
-  return it != std::begin(kMarkRanges) && cp <= std::prev(it)->last;
-}
-
-void appendFolded(char32_t cp, std::string& out) {
-  if (cp < 0x80) {
-    out.push_back(static_cast<char>(cp >= 'A' && cp <= 'Z' ? cp + ('a' - 'A') : cp));
-    return;
-  }
-  if (isMark(cp)) return;
-  auto single = std::lower_bound(std::begin(kSingleFolds), std::end(kSingleFolds), cp,
-                                 [](const SingleFold& f, char32_t c) { return f.from < c; });
-  if (single != std::end(kSingleFolds) && single->from == cp) {
-    encode(single->to, out);
-    return;
-  }
-  auto multi = std::lower_bound(std::begin(kMultiFolds), std::end(kMultiFolds), cp,
-                                [](const MultiFold& f, char32_t c) { return f.from < c; });
-  if (multi != std::end(kMultiFolds) && multi->from == cp) {
-    for (char32_t to : multi->to)
-      if (to != 0) encode(to, out);
-    return;
-  }
-  encode(cp, out);
+  cps.resize(w);
 }
 
 }  // namespace
 
 std::string foldForMatch(std::string_view utf8) {
+  std::vector<CodePoint> cps;
+  cps.reserve(utf8.size());
+  const auto* bytes = reinterpret_cast<const utf8proc_uint8_t*>(utf8.data());
+  for (std::size_t i = 0; i < utf8.size();) {
+    CodePoint cp = 0;
+    utf8proc_ssize_t n = utf8proc_iterate(bytes + i, static_cast<utf8proc_ssize_t>(utf8.size() - i), &cp);
+    if (n <= 0) cp = kReplacement, n = 1;  // one byte of a malformed sequence
+    i += static_cast<std::size_t>(n);
+    appendFolded(cp, cps);
+  }
+  orderMarks(cps);
+  composeSyllables(cps);
+
   std::string out;
-  out.reserve(utf8.size());
-  for (std::size_t i = 0; i < utf8.size();) appendFolded(decode(utf8, i), out);
+  out.reserve(cps.size());
+  utf8proc_uint8_t encoded[4];
+  for (CodePoint cp : cps)
+    out.append(reinterpret_cast<const char*>(encoded), static_cast<std::size_t>(utf8proc_encode_char(cp, encoded)));
   return out;
 }
 

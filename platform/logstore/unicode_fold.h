@@ -8,8 +8,9 @@ namespace logstore {
 
 /// Folds UTF-8 text for comparisons that ignore case and diacritics: each
 /// character becomes the case fold of its canonical decomposition without
-/// nonspacing marks, for all of Unicode (tables generated from the Unicode
-/// data by tools/gen_fold_table.py). Invalid bytes become U+FFFD.
+/// nonspacing marks (general category Mn), for all of Unicode, with the
+/// Unicode data of utf8proc. Hangul syllables stay whole. Each byte of a
+/// malformed sequence becomes U+FFFD. Folding a fold changes nothing.
 std::string foldForMatch(std::string_view utf8);
 
 /// True when `haystack` contains `needle` ignoring case and diacritics.

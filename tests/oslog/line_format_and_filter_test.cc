@@ -76,7 +76,11 @@ TEST(ImageFragment, MatchesIgnoringCaseAndDiacritics) {
   for (auto [fragment, path, expected] :
        {std::tuple{"zélmar", "/opt/Ze\u0301lmar", true}, {"αθηνα/y", "/usr/lib/ΆΘΉΝΑ/ÿ", true},
         {"иошкар", "/srv/Йошкар", true}, {"STRASSE", "/srv/Straße", true}, {"zelmar", "/bad/\xff/Zelmar", true},
-        {"orsted", "/srv/Ørsted", false} /* a letter of its own */, {"", "/usr/sbin/Telhub", false}}) {
+        {"orsted", "/srv/Ørsted", false} /* a letter of its own */, {"", "/usr/sbin/Telhub", false},
+        {"zelmar", "/bad/Zel\xffmar", false} /* an invalid byte does not vanish */,
+        {"का", "/opt/कि", false} /* a spacing vowel sign is no diacritic */,
+        {"a\U00016FF0\U0001D165", "/opt/a\U0001D165\u0301\U00016FF0", true} /* canonical order of marks */,
+        {"가", "/opt/각", false} /* not part of a syllable */, {"각", "/opt/\u1100\u1161\u11A8", true}}) {
     Event e = oslog_test::messageEvent(0, "x", "m");
     e.senderImagePath.assign(path);
     EXPECT_EQ(logstore::Predicate({}, {fragment}).matches(e), expected) << fragment << " in " << path;
