@@ -1,7 +1,9 @@
 // SPDX-License-Identifier: MIT
 #include <gtest/gtest.h>
 
+#include <cctype>
 #include <optional>
+#include <string_view>
 
 #include "stdio_capture.h"
 #include "test_tree.h"
@@ -41,6 +43,22 @@ struct Session {
   bool result;
   std::vector<std::string> calls;
 };
+void PrintTo(const Session& s, std::ostream* os) { *os << s.what; }
+
+/// "cd and back" -> "CdAndBack": the case's test name.
+std::string caseName(const testing::TestParamInfo<Session>& info) {
+  std::string name;
+  bool wordStart = true;
+  for (char c : std::string_view(info.param.what)) {
+    if (!std::isalnum(static_cast<unsigned char>(c))) {
+      wordStart = true;
+    } else {
+      name.push_back(wordStart ? static_cast<char>(std::toupper(static_cast<unsigned char>(c))) : c);
+      wordStart = false;
+    }
+  }
+  return name;
+}
 
 class ShellSession : public testing::TestWithParam<Session> {};
 
@@ -84,7 +102,8 @@ INSTANTIATE_TEST_SUITE_P(
         Session{"cd without a path", {"cd"}, "", rootHelp, false, {}},
         Session{"cd with two words", {"logdump", "cd", "a", "b"}, "", logdumpHelp, false, {}},
         Session{"cd to an unknown place", {"cd", "logdump/nowhere"}, "", logdumpHelp, false, {}},
-        Session{"words are case-sensitive", {"Logdump"}, "", invalid("Logdump") + rootHelp, false, {}}));
+        Session{"words are case-sensitive", {"Logdump"}, "", invalid("Logdump") + rootHelp, false, {}}),
+    caseName);
 
 INSTANTIATE_TEST_SUITE_P(
     Interactive, ShellSession,
@@ -104,7 +123,8 @@ INSTANTIATE_TEST_SUITE_P(
         Session{"sticky flag runs only the first group", {}, "logdump fail\nlogdump tel -- logdump tel\n",
                 kRoot + kRoot + kRoot, false, {"logdump:fail", "logdump:tel"}},
         Session{"quit after failures", {}, "bogus\nquit\nhelp\n", kRoot + invalid("bogus") + rootHelp + kRoot, true, {}},
-        Session{"exit inside a group", {}, "cd logdump\nexit\n", kRoot + kLogdump, true, {}}));
+        Session{"exit inside a group", {}, "cd logdump\nexit\n", kRoot + kLogdump, true, {}}),
+    caseName);
 
 class NoRoot : public CommandShell {
   std::shared_ptr<CommandBase> createRootCommand() override { return nullptr; }

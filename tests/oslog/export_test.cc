@@ -60,8 +60,11 @@ TEST_P(AStreamEnding, SucceedsWhateverTheReasonAndLogsAbnormalOnes) {
   EXPECT_EQ(oslog_test::splitLines(readFile(out_)).size(), 1u);
 }
 
-INSTANTIATE_TEST_SUITE_P(Reasons, AStreamEnding, testing::Values(logstore::kReasonEnded, logstore::kReasonReadError,
-                                                                 std::uint64_t{1234}));
+INSTANTIATE_TEST_SUITE_P(Reasons, AStreamEnding,
+                         testing::Values(logstore::kReasonEnded, logstore::kReasonReadError, std::uint64_t{1234}),
+                         [](const testing::TestParamInfo<std::uint64_t>& info) {
+                           return "Reason" + std::to_string(info.param);
+                         });
 
 TEST_F(AnExportOverAFakeStore, TimeoutInvalidatesFailsAndKeepsThePartialFile) {
   auto delivered = messageEvent(secondsAgo(2), "Telhub", "delivered before the wait ran out");
@@ -103,6 +106,7 @@ struct ParseCase {
   Words words;
   logdump::OsLogRequest expected;
 };
+void PrintTo(const ParseCase& c, std::ostream* os) { *os << c.name; }
 
 class OsLogArguments : public testing::TestWithParam<ParseCase> {};
 

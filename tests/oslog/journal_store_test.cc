@@ -66,6 +66,7 @@ struct FilterCase {
   Words options;
   Words expectedProcesses;
 };
+void PrintTo(const FilterCase& c, std::ostream* os) { *os << c.name; }
 
 class AFilteredJournalExport : public AnExportFromTheJournal, public testing::WithParamInterface<FilterCase> {};
 

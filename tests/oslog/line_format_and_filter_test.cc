@@ -34,6 +34,7 @@ struct LineCase {
   Event event;
   std::string expected;
 };
+void PrintTo(const LineCase& c, std::ostream* os) { *os << c.name; }
 
 class LineFormat : public testing::TestWithParam<LineCase> {};
 
