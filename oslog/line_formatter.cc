@@ -52,10 +52,20 @@ void appendDecimal(std::int32_t value, std::string& out) {
 }
 
 void appendField(const logstore::Text& field, std::string& out) {
-  if (field.has())
-    appendUtf8(field.view(), out);
-  else
+  if (!field.has()) {
     out.append(kNull);
+    return;
+  }
+  // One line per entry: a line break inside a field (a multi-line message)
+  // is written as the two characters "\n". A newline byte never lies inside
+  // a UTF-8 sequence, so the pieces are checked alike.
+  std::string_view text = field.view();
+  for (auto end = text.find('\n'); end != std::string_view::npos; end = text.find('\n')) {
+    appendUtf8(text.substr(0, end), out);
+    out.append("\\n");
+    text.remove_prefix(end + 1);
+  }
+  appendUtf8(text, out);
 }
 
 /// Length of the well-formed UTF-8 sequence at `s[i]`, or 0.

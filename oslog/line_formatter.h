@@ -12,9 +12,10 @@ namespace oslog {
 /// Builds the export's text lines:
 ///   "<local date> +0000 0x<thread, 5+ hex digits> 0x<activity hex> <pid>
 ///    <process>(<sender>):<subsystem> [<category>] <message>\n"
-/// with "(null)" for a missing text field and U+FFFD for each invalid UTF-8
-/// byte. Keeps the date text of the last second it printed, since a log
-/// holds many entries per second.
+/// with "(null)" for a missing text field, U+FFFD for each invalid UTF-8
+/// byte and "\n" (backslash, n) for a line break inside a field. Keeps the
+/// date text of the last second it printed, since a log holds many entries
+/// per second.
 class LineFormatter {
  public:
   /// Appends the line for `event` to `out`.

@@ -57,6 +57,8 @@ INSTANTIATE_TEST_SUITE_P(
                  event(0, 0, 3, {"T\xff", "s", nullptr, nullptr, "é \xf0\x9f\x93\xb6 \xc0\x80|\xed\xa0\x80|a\xff" "b\xc3"}),
                  kDate + "0x00000 0x0 3 T\uFFFD(s):(null) [(null)] é \xf0\x9f\x93\xb6 "
                          "\uFFFD\uFFFD|\uFFFD\uFFFD\uFFFD|a\uFFFDb\uFFFD\n"},
+        LineCase{"LineBreaksInFieldsStayOnTheLine", event(0, 0, 4, {"p\n", "s", nullptr, nullptr, "one\ntwo\n\xff\n"}),
+                 kDate + "0x00000 0x0 4 p\\n(s):(null) [(null)] one\\ntwo\\n\uFFFD\\n\n"},
         LineCase{"NoonTwoHoursEastPrintsNoon", at((1772712000LL - 7200) * 1000000, 7200),
                  "2026-03-05 12:00:00 +0000 " + kTail},
         LineCase{"WestOffsetCrossesNewYear", at(1767225600LL * 1000000 + 999999, -3600),
