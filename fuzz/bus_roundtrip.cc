@@ -1,0 +1,77 @@
+// SPDX-License-Identifier: MIT
+// Message objects onto the wire and back: what can be sent arrives unchanged.
+#include <cstddef>
+#include <cstdint>
+
+#include "fuzz/code_points.h"
+#include "fuzz/fuzz_check.h"
+#include "fuzz/offline_bus.h"
+#include "fuzz/xpc_from_bytes.h"
+#include "platform/linux/bus_message.h"
+
+namespace {
+
+using vorn::bus::kMaxNesting;
+
+/// What sd-bus accepts as a string: UTF-8 without NUL, surrogates or
+/// noncharacters (U+FDD0..U+FDEF and the last two code points of each plane).
+bool sendableText(const std::string& s) {
+  return fuzz::everyCodePoint(s, [](utf8proc_int32_t cp) {
+    return cp != 0 && !(cp >= 0xFDD0 && cp <= 0xFDEF) && (cp & 0xFFFE) != 0xFFFE;
+  });
+}
+
+/// Whether appendDictionary can send `v`, found at container depth `depth`.
+/// Null values are left out, so what they would hold never counts.
+bool sendable(const xpc::object& v, int depth) {
+  if (const auto* s = v.asString()) return sendableText(*s);
+  if (const auto* items = v.asArray()) {
+    if (depth > kMaxNesting) return false;
+    for (const auto& item : *items)
+      if (!sendable(item, depth + 1)) return false;
+  }
+  if (const auto* entries = v.asEntries()) {
+    if (depth > kMaxNesting) return false;
+    for (const auto& [key, value] : *entries)
+      if (!value.isNull() && (!sendableText(key) || !sendable(value, depth + 1))) return false;
+  }
+  return true;
+}
+
+/// `v` as the other side sees it: without the null values D-Bus cannot carry.
+xpc::object withoutNulls(const xpc::object& v) {
+  if (const auto* items = v.asArray()) {
+    std::vector<xpc::object> kept;
+    for (const auto& item : *items)
+      if (!item.isNull()) kept.push_back(withoutNulls(item));
+    return xpc::object::array(std::move(kept));
+  }
+  if (const auto* entries = v.asEntries()) {
+    std::vector<xpc::entry> kept;
+    for (const auto& [key, value] : *entries)
+      if (!value.isNull()) kept.emplace_back(key, withoutNulls(value));
+    return xpc::object::dictionary(std::move(kept));
+  }
+  return v;
+}
+
+}  // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
+  FuzzedDataProvider in(data, size);
+  const xpc::object sent = fuzz::XpcFromBytes(in, {}, kMaxNesting + 2).object();
+
+  auto m = fuzz::newOfflineMessage();
+  FUZZ_CHECK(m);
+  const bool appended = vorn::bus::appendDictionary(m.get(), sent);
+  // Anything but a dictionary goes as an empty one.
+  const xpc::object expected = sent.isDictionary() ? withoutNulls(sent) : xpc::object::dictionary({});
+  FUZZ_CHECK(appended == (!sent.isDictionary() || sendable(sent, 0)));
+  if (!appended) return 0;
+
+  FUZZ_CHECK(fuzz::sealForReading(m.get()));
+  xpc::object received;
+  FUZZ_CHECK(vorn::bus::readDictionary(m.get(), received));
+  FUZZ_CHECK(fuzz::identical(received, expected));
+  return 0;
+}
