@@ -3,6 +3,7 @@
 
 #include <memory>
 
+#include "framework/progress.h"
 #include "platform/dispatch.h"
 #include "platform/helper_client.h"
 #include "platform/vorn_client.h"
@@ -20,6 +21,9 @@ struct ToolContext {
   std::shared_ptr<DeviceProfile> device{};
   /// Makes the helper service's client when a command needs one; empty: none.
   vorn::HelperClient::Factory helpers{};
+  /// Shows the user that a command is waiting or working; silent unless the
+  /// tool runs at a terminal that can draw it.
+  std::shared_ptr<Progress> progress = silentProgress();
 
   /// `manager` and `queue` with this machine's device and helper service.
   static ToolContext onThisDevice(std::shared_ptr<vorn::client::Manager> manager,
