@@ -10,15 +10,19 @@ namespace terminal {
 
 bool colourWanted(const char* noColor, const char* term) {
   if (noColor && *noColor) return false;
-  return !(term && std::string_view(term) == "dumb");
+  return !dumbTerminal(term);
 }
+
+bool dumbTerminal(const char* term) { return term && std::string_view(term) == "dumb"; }
 
 Facts probe() {
   Facts facts;
   facts.inputIsTerminal = isatty(STDIN_FILENO) == 1;
   facts.outputIsTerminal = isatty(STDOUT_FILENO) == 1;
   facts.errorIsTerminal = isatty(STDERR_FILENO) == 1;
-  facts.colour = colourWanted(std::getenv("NO_COLOR"), std::getenv("TERM"));
+  const char* term = std::getenv("TERM");
+  facts.colour = colourWanted(std::getenv("NO_COLOR"), term);
+  facts.dumb = dumbTerminal(term);
   return facts;
 }
 

@@ -12,11 +12,16 @@ struct Facts {
   bool outputIsTerminal = false;
   bool errorIsTerminal = false;
   bool colour = true;
+  /// TERM is "dumb": the terminal cannot move its cursor or clear a line.
+  bool dumb = false;
 };
 
 /// Colour stays on, also into pipes, unless NO_COLOR holds a non-empty value
 /// or TERM is "dumb". Either argument may be null (variable not set).
 bool colourWanted(const char* noColor, const char* term);
+
+/// True when TERM (null: not set) names the dumb terminal.
+bool dumbTerminal(const char* term);
 
 /// The facts of this process's standard streams and environment.
 Facts probe();
