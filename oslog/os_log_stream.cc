@@ -27,6 +27,8 @@ namespace {
 struct ExportState {
   oslog::ExportFile file;
   oslog::LineFormatter formatter;
+  oslog::ExportObserver* observer = nullptr;
+  std::uint64_t lines = 0;
 };
 
 }  // namespace
@@ -37,10 +39,18 @@ bool OsLogStream::putOsLogStreamToFile(const std::string& path, const std::vecto
   return putOsLogStreamToFile(*store, path, processes, imagePaths, history);
 }
 
+bool OsLogStream::putOsLogStreamToFile(const std::string& path, const std::vector<std::string>& processes,
+                                       const std::vector<std::string>& imagePaths, double history,
+                                       oslog::ExportObserver& observer) {
+  auto store = logstore::localStore();
+  return putOsLogStreamToFile(*store, path, processes, imagePaths, history, kStreamTimeout, &observer);
+}
+
 bool OsLogStream::putOsLogStreamToFile(logstore::Store& store, const std::string& path,
                                        const std::vector<std::string>& processes,
                                        const std::vector<std::string>& imagePaths, double history,
-                                       std::chrono::nanoseconds timeout) {
+                                       std::chrono::nanoseconds timeout,
+                                       oslog::ExportObserver* observer) {
   std::unique_ptr<logstore::Stream> stream;
   logstore::Prepared prepared = store.prepare();
   if (prepared.source)
@@ -53,6 +63,7 @@ bool OsLogStream::putOsLogStreamToFile(logstore::Store& store, const std::string
   }
 
   auto state = std::make_shared<ExportState>();
+  state->observer = observer;
   if (!state->file.create(path)) {
     logError("Failed to create file: %s", path.c_str());
     return false;
@@ -69,9 +80,12 @@ bool OsLogStream::putOsLogStreamToFile(logstore::Store& store, const std::string
     if (event.type != logstore::kEventTypeLogMessage) return;
     state->formatter.append(event, state->file.buffer());
     state->file.lineAdded();
+    if (++state->lines % oslog::ExportObserver::kLinesPerReport == 0 && state->observer)
+      state->observer->linesWritten(state->lines);
   });
   stream->setInvalidationHandler([state, group](std::uint64_t reason) {
     state->file.flush();
+    if (state->observer) state->observer->linesWritten(state->lines);
     if (reason != logstore::kReasonEnded) logError("Invalid oslog stream: reason = %lu", static_cast<unsigned long>(reason));
     group.leave();
   });
@@ -81,6 +95,7 @@ bool OsLogStream::putOsLogStreamToFile(logstore::Store& store, const std::string
 
   group.enter();
   logError("Getting oslog stream: history = %f", history);
+  if (observer) observer->started();
   stream->activateStreamFromDate(start);
 
   const bool ended = group.wait(timeout);
@@ -93,5 +108,6 @@ bool OsLogStream::putOsLogStreamToFile(logstore::Store& store, const std::string
   if (!written)
     logError("Failed to write file: %s (%s)", path.c_str(), std::strerror(state->file.writeError()));
   stream.reset();
+  if (observer) observer->finished();
   return ended && written;
 }

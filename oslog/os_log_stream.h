@@ -5,6 +5,7 @@
 #include <string>
 #include <vector>
 
+#include "oslog/export_observer.h"
 #include "platform/logstore/log_store.h"
 
 /// Copies recent entries of the log store into a text file, one line per log
@@ -22,10 +23,16 @@ class OsLogStream {
   /// finished within kStreamTimeout.
   static bool putOsLogStreamToFile(const std::string& path, const std::vector<std::string>& processes,
                                    const std::vector<std::string>& imagePaths, double history);
+  /// The same, telling `observer` how far it has come.
+  static bool putOsLogStreamToFile(const std::string& path, const std::vector<std::string>& processes,
+                                   const std::vector<std::string>& imagePaths, double history,
+                                   oslog::ExportObserver& observer);
 
-  /// The same over a given store, with a wait bound that tests may shorten.
+  /// The same over a given store, with a wait bound that tests may shorten
+  /// and an optional observer.
   static bool putOsLogStreamToFile(logstore::Store& store, const std::string& path,
                                    const std::vector<std::string>& processes,
                                    const std::vector<std::string>& imagePaths, double history,
-                                   std::chrono::nanoseconds timeout = kStreamTimeout);
+                                   std::chrono::nanoseconds timeout = kStreamTimeout,
+                                   oslog::ExportObserver* observer = nullptr);
 };

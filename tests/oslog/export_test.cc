@@ -98,6 +98,39 @@ TEST_F(AnExportOverAFakeStore, AFailedWriteFailsTheExport) {
                                     "Failed to write file: /dev/full (No space left on device)"));
 }
 
+/// What an observer was told, in order.
+struct RecordingObserver : oslog::ExportObserver {
+  void started() override { calls.push_back("started"); }
+  void linesWritten(std::uint64_t lines) override { calls.push_back(std::to_string(lines)); }
+  void finished() override { calls.push_back("finished"); }
+  std::vector<std::string> calls;
+};
+
+TEST_F(AnExportOverAFakeStore, TellsItsObserverOfTheStreamOnlyWhileOneRuns) {
+  struct Case {
+    const char* what;
+    oslog_test::FakeScript script;
+    std::string path;
+    std::vector<std::string> calls;
+  };
+  std::vector<logstore::Event> many(513, messageEvent(secondsAgo(5), "Telhub", "m"));
+  oslog_test::FakeScript unopenable;
+  unopenable.openError = "gone";
+  const Case cases[] = {
+      {"lines", {many}, out_, {"started", "256", "512", "513", "finished"}},
+      {"no lines", {}, out_, {"started", "0", "finished"}},
+      {"timed out", {{many[0]}, std::nullopt}, out_, {"started", "1", "finished"}},
+      {"store not opened", unopenable, out_, {}},
+      {"file not created", {many}, dir_.path + "/missing/x.txt", {}},
+  };
+  for (const auto& c : cases) {
+    oslog_test::FakeStore store(c.script);
+    RecordingObserver observer;
+    OsLogStream::putOsLogStreamToFile(store, c.path, {}, {}, 60, 200ms, &observer);
+    EXPECT_EQ(observer.calls, c.calls) << c.what;
+  }
+}
+
 /// A handler's word list for words in command-line order.
 std::list<std::string> wordList(const Words& words) { return {words.rbegin(), words.rend()}; }
 
