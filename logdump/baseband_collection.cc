@@ -25,9 +25,10 @@ std::string askHelperForSnapshot(const ToolContext& context) {
   return xpc::dyn_cast_or_default(response.get(vorn::helper::kKeyTimestampString), "");
 }
 
-void reportWithoutServer(const ToolContext& context) {
+void reportWithoutServer(const ToolContext& context, ProgressScope& waiting) {
   std::string timestamp;
   if (context.device->internalOrCarrier()) timestamp = askHelperForSnapshot(context);
+  waiting.end();
   std::cout << "Baseband log collection: Success (Vorn not running)" << std::endl;
   if (!timestamp.empty())
     std::cout << "Path = " << vorn::trace::kSnapshotFolder << vorn::trace::kLogDirPrefix
@@ -40,6 +41,9 @@ void reportWithoutServer(const ToolContext& context) {
 }  // namespace
 
 bool collectBasebandLogs(LogdumpCommand& command, std::list<std::string> args) {
+  // Every request below blocks until its answer; the line goes before any
+  // result is printed.
+  ProgressScope waiting(command.getContext().progress, Progress::Activity::waitingForServer);
   xpc::dict query;
   query.set(vorn::kKeyTraceName, xpc::object::string(vorn::kTraceBaseband));
   query.set(vorn::kKeyTracePropertyName, xpc::object::string(vorn::kKeyTraceEnabled));
@@ -48,12 +52,14 @@ bool collectBasebandLogs(LogdumpCommand& command, std::list<std::string> args) {
       command.getManager(), vorn::kCommandGetTraceProperty, query.obj(), enabledResponse);
   const bool succeeded = enabled.status == 0;
   if (!succeeded || !enabledResponse.isDictionary()) {
+    waiting.end();
     std::cout << "Baseband log collection: Failed" << std::endl;
     return succeeded;
   }
   const std::string value =
       xpc::dyn_cast_or_default(enabledResponse.get(vorn::kKeyTracePropertyValue), vorn::kUnknown);
   if (value != "1" && value != "true") {
+    waiting.end();
     std::cout << "Baseband logs are not enabled" << std::endl;
     return true;
   }
@@ -73,8 +79,11 @@ bool collectBasebandLogs(LogdumpCommand& command, std::list<std::string> args) {
   const auto dump = vorn::client::PerformCommand(command.getManager(), vorn::kCommandTraceDumpState,
                                                  request.obj(), response);
   if (dump.status == kResultServerNotRunning) {
-    reportWithoutServer(command.getContext());
-  } else if (dump.status != 0) {
+    reportWithoutServer(command.getContext(), waiting);
+    return true;
+  }
+  waiting.end();
+  if (dump.status != 0) {
     std::cout << "Baseband log collection: Failed" << std::endl;
   } else {
     std::cout << "Baseband log collection: Success (Vorn running)" << std::endl;

@@ -4,6 +4,7 @@
 #include <iostream>
 
 #include "logdump/baseband_collection.h"
+#include "logdump/export_progress.h"
 #include "logdump/logdump_options.h"
 #include "logdump/oslog_command.h"
 #include "logdump/telephony_collection.h"
@@ -68,9 +69,10 @@ void LogdumpCommand::registerCommands() {
       "[nocompress|tar.gz|tar] <reason> collect baseband logs only", basebandWords);
   addCommandHandler(
       "oslog",
-      [](dispatch::group group, std::list<std::string> args) {
+      [this](dispatch::group group, std::list<std::string> args) {
         GroupMembership membership(std::move(group));
-        return logdump::runOsLogCommand(std::move(args));
+        logdump::ExportProgress progress(context.progress);
+        return logdump::runOsLogCommand(std::move(args), &progress);
       },
       "[history size] [output txt file path] -p <process1 process2..> -i <imagePath1 imagePath2..> "
       "collect oslog to txt",

@@ -60,12 +60,15 @@ std::optional<OsLogRequest> parseOsLogArguments(std::list<std::string> args) {
   return request;
 }
 
-bool runOsLogCommand(std::list<std::string> args) {
+bool runOsLogCommand(std::list<std::string> args, oslog::ExportObserver* observer) {
   auto request = parseOsLogArguments(std::move(args));
   if (!request) {
     std::cout << "os log collection: Failed" << std::endl;
     return false;
   }
+  if (observer)
+    return OsLogStream::putOsLogStreamToFile(request->path, request->processes, request->imagePaths,
+                                             request->history, *observer);
   return OsLogStream::putOsLogStreamToFile(request->path, request->processes, request->imagePaths,
                                            request->history);
 }

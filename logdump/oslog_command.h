@@ -6,6 +6,8 @@
 #include <string>
 #include <vector>
 
+#include "oslog/export_observer.h"
+
 namespace logdump {
 
 /// What `logdump oslog <history> <path> [-p <process>...] [-i <fragment>...]`
@@ -31,7 +33,7 @@ std::optional<OsLogRequest> parseOsLogArguments(std::list<std::string> args);
 
 /// The "oslog" handler: parses `args` and runs the export, returning its
 /// result; prints "os log collection: Failed" when fewer than two words were
-/// given.
-bool runOsLogCommand(std::list<std::string> args);
+/// given. `observer`, when given, follows the export.
+bool runOsLogCommand(std::list<std::string> args, oslog::ExportObserver* observer = nullptr);
 
 }  // namespace logdump

@@ -34,8 +34,13 @@ struct TelephonyCompletion {
   CompressionMode compression;
   TelephonyDump kind;
   std::shared_ptr<DeviceProfile> device;
+  /// Declared after the membership, so that it is gone before the group
+  /// lets the worker go on.
+  std::shared_ptr<ProgressScope> waiting;
 
   void operator()(TelephonyXPC::Result result, xpc::object response) const {
+    // The progress line goes before the result comes, never after it.
+    waiting->end();
     const bool core = kind == TelephonyDump::logsWithCoredump;
     std::cout << (core ? "Telephony log collection with Coredump: " : "Telephony log collection: ")
               << (result.status == 0 ? "Success" : "Failed") << std::endl;
@@ -53,6 +58,9 @@ struct TelephonyCompletion {
 
 bool collectTelephonyLogs(LogdumpCommand& command, dispatch::group group,
                           std::list<std::string> args, TelephonyDump kind) {
+  // From the trace mode query until the completion prints.
+  auto waiting = std::make_shared<ProgressScope>(command.getContext().progress,
+                                                 Progress::Activity::waitingForServer);
   CompressionMode compression = TarGz;
   bool noUserConfirmation = false;
   std::string reason;
@@ -63,7 +71,8 @@ bool collectTelephonyLogs(LogdumpCommand& command, dispatch::group group,
   xpc::dict request = buildRequest(kind, reason, compression, noUserConfirmation);
   GroupMembership handlerMembership(group);
   vorn::client::Completion completion =
-      TelephonyCompletion{GroupMembership(group), compression, kind, command.getContext().device};
+      TelephonyCompletion{GroupMembership(group), compression, kind, command.getContext().device,
+                          std::move(waiting)};
   vorn::client::PerformCommand(command.getManager(), vorn::kCommandTraceDumpState,
                                std::move(completion), request.obj());
   return true;

@@ -11,6 +11,7 @@
 #include "platform/device.h"
 #include "terminal/open_line_reader.h"
 #include "terminal/terminal_facts.h"
+#include "terminal/terminal_progress.h"
 #include "tool/vorn_shell.h"
 
 bool passesStartupChecks() { return passesStartupChecks(*DeviceProfile::ofThisDevice()); }
@@ -33,9 +34,11 @@ void* RunShellThread(void* wordList) {
   const std::list<std::string> words = *static_cast<std::list<std::string>*>(wordList);
   // exit() does not unwind this stack: the shell, and with it the tree, the
   // connection and the queue, stay alive until the process is gone.
-  auto shell = std::make_shared<VornShell>();
   const terminal::Facts facts = terminal::probe();
   colour::setEnabled(facts.colour);
+  ToolContext context = ToolContext::onThisDevice({}, {});
+  context.progress = terminal::openProgress(facts);
+  auto shell = std::make_shared<VornShell>(vorn::client::CreateManager, std::move(context));
   shell->setLineReader(terminal::openLineReader(facts, getprogname()));
   const bool ok = shell->run(words);
   std::exit(ok ? 0 : 1);
