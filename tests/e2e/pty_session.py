@@ -2,7 +2,7 @@
 # SPDX-License-Identifier: MIT
 """Runs a program on a pseudo-terminal and plays a script of keys against it.
 
-    pty_session.py [--stdout FILE] [--cols N] [--timeout S] STEPS -- COMMAND [ARG...]
+    pty_session.py [--stdout FILE] [--screen FILE] [--cols N] [--timeout S] STEPS -- COMMAND [ARG...]
 
 STEPS is a JSON list of ["send", text] and ["expect", regex]. An expectation
 waits, up to the timeout, for the regex to match the terminal's output that
@@ -13,6 +13,11 @@ error) when an expectation or the end did not come in time.
 
 With --stdout the program's standard output goes to FILE instead of the
 terminal, while its standard input and standard error stay on the terminal.
+
+With --screen the text that the screen shows at the end is written to FILE:
+what remains after carriage returns, line feeds, backspaces and clearing to
+the end of the line (ESC [ K) have done their work; other escape sequences
+are dropped, and trailing blanks and empty last lines are left out.
 """
 
 import argparse
@@ -55,7 +60,7 @@ class Terminal:
         return False
 
     def expect(self, pattern, timeout):
-        regex = re.compile(pattern.encode("latin-1"), re.DOTALL)
+        regex = re.compile(pattern.encode("utf-8"), re.DOTALL)
         deadline = time.monotonic() + timeout
         while True:
             found = regex.search(self.seen, self.mark)
@@ -64,6 +69,40 @@ class Terminal:
                 return True
             if time.monotonic() >= deadline or not self.pump(deadline):
                 return bool(regex.search(self.seen, self.mark))
+
+
+def final_screen(output):
+    rows = [[]]
+    row = col = 0
+    text = output.decode("utf-8", "replace")
+    i = 0
+    while i < len(text):
+        c = text[i]
+        i += 1
+        if c == "\r":
+            col = 0
+        elif c == "\n":
+            row += 1
+            rows.extend([] for _ in range(row + 1 - len(rows)))
+        elif c == "\b":
+            col = max(0, col - 1)
+        elif c == "\x1b":
+            match = re.compile(r"\[([0-9;?]*)([@-~])").match(text, i)
+            if match:
+                i = match.end()
+                if match.group(2) == "K" and match.group(1) in ("", "0"):
+                    del rows[row][col:]
+            else:
+                i += 1  # a two-character sequence
+        elif c >= " ":
+            line = rows[row]
+            line.extend(" " * (col + 1 - len(line)))
+            line[col] = c
+            col += 1
+    lines = ["".join(line).rstrip() for line in rows]
+    while lines and not lines[-1]:
+        lines.pop()
+    return "".join(line + "\n" for line in lines)
 
 
 def fail(terminal, reason):
@@ -76,6 +115,7 @@ def fail(terminal, reason):
 def main():
     parser = argparse.ArgumentParser()
     parser.add_argument("--stdout")
+    parser.add_argument("--screen")
     parser.add_argument("--cols", type=int, default=80)
     parser.add_argument("--timeout", type=float, default=30.0)
     parser.add_argument("steps")
@@ -114,6 +154,9 @@ def main():
         child.wait()
         return fail(terminal, "the program did not end")
     sys.stdout.buffer.write(terminal.seen)
+    if args.screen:
+        with open(args.screen, "w", encoding="utf-8") as screen:
+            screen.write(final_screen(terminal.seen))
     return child.returncode
 
 

@@ -43,15 +43,16 @@ std::string json(const std::vector<Step>& steps) {
   return text + "]";
 }
 
-/// A shell command that plays `steps` against vorntool on a pseudo-terminal:
-/// a known terminal type, colour not switched off, no user's editrc, and
-/// the history under $VORN_ROOT/../state unless `env` says otherwise.
+/// A shell command that plays `steps` against `command` (vorntool and its
+/// arguments) on a pseudo-terminal: a known terminal type, colour not
+/// switched off, no user's editrc, and the history under $VORN_ROOT/../state
+/// unless `env` says otherwise.
 std::string onTerminal(const std::vector<Step>& steps, const std::string& env = "",
-                       const std::string& driverOptions = "") {
+                       const std::string& driverOptions = "", const std::string& command = "vorntool") {
   return "env -u NO_COLOR -u EDITRC TERM=xterm HOME=\"$VORN_ROOT/..\" "
          "XDG_STATE_HOME=\"$VORN_ROOT/../state\" " + env + " python3 " +
          quoted(VORN_SOURCE_DIR "/tests/e2e/pty_session.py") + " " + driverOptions + " " +
-         quoted(json(steps)) + " -- vorntool";
+         quoted(json(steps)) + " -- " + command;
 }
 
 TEST(VorntoolTerminal, TabCompletesFromTheCommandTree) {
@@ -126,6 +127,58 @@ TEST(VorntoolColour, NoColorAndDumbTerminalsGetTheSameTextWithoutEscapes) {
     NO_COLOR=1 vorntool bogus | grep -c $'\x1b'
     true)sh");
   EXPECT_EQ(r.out, "1\n1\nNO_COLOR: plain help\ndumb: plain report\n0\n") << r.err;
+}
+
+/// The server answers every request only after a while.
+const std::vector<std::string> kSlowServer = {"--vornd-arg", "--reply-delay-ms", "--vornd-arg", "600"};
+const std::string kWaiting = "waiting for the server\u2026 [0-9]+ s";
+/// The line shown until the result comes, and cleared just before it.
+std::string clearedBefore(const std::string& result) { return "[0-9] s\r\x1b\\[K" + result; }
+const std::string kScreenOption = "--screen \"$VORN_ROOT/../screen\"";
+/// The final screen, with the collection's timestamp made constant.
+const std::string kShowScreen = "sed 's/log-bb-[-0-9]*/log-bb-TS/' \"$VORN_ROOT/../screen\"\n";
+const std::string kBasebandResult =
+    "Baseband log collection: Success (Vorn running)\n"
+    "Path = /var/wireless/Library/Logs/CrashReporter/Baseband/log-bb-TS.tar.gz\n";
+
+TEST(VorntoolProgress, ASlowAnswerShowsTheWaitAndTheScreenEndsWithTheResultOnly) {
+  auto r = runInSandbox(kSlowServer, onTerminal({expect(kWaiting), expect(clearedBefore("Baseband log collection"))}, "",
+                                                kScreenOption, "vorntool logdump bb x") +
+                                         " >\"$VORN_ROOT/../raw\"; echo \"status $?\"\n" + kShowScreen +
+                                         "[ $(grep -o 'waiting for the server' \"$VORN_ROOT/../raw\" | wc -l) -gt 1 ] "
+                                         "&& echo redrawn");
+  EXPECT_EQ(r.out, "status 0\n" + kBasebandResult + "redrawn\n") << r.err;
+}
+
+TEST(VorntoolProgress, TheTelephonyWaitIsGoneBeforeItsCompletionPrints) {
+  // The server's state arrives as late as every answer: "bb", which runs
+  // without it, gives it time to come before "tel" needs it.
+  auto r = runInSandbox(kSlowServer, onTerminal({
+      expect(kPrompt), send("logdump bb x\r"), expect(kWaiting), expect(kPrompt),
+      send("logdump tel x\r"), expect(kWaiting), expect(clearedBefore("Telephony log collection: Success")),
+      expect(kPrompt),
+      send("quit\r"),
+  }, "", kScreenOption) + " >/dev/null; echo \"status $?\"\n" + kShowScreen);
+  EXPECT_EQ(r.out, "status 0\n(/vorntool)>> logdump bb x\n" + kBasebandResult +
+                       "(/vorntool)>> logdump tel x\n"
+                       "Telephony log collection: Success\n"
+                       "Path = /var/wireless/Library/Logs/CrashReporter/Baseband/log-bb-TS.tar.gz\n"
+                       "(/vorntool)>> quit\n")
+      << r.err;
+}
+
+TEST(VorntoolProgress, NothingIsDrawnIntoAFileOrOnADumbTerminal) {
+  // What the terminal got, control characters made visible.
+  const std::string shown = " | cat -v | sed 's/log-bb-[-0-9]*/log-bb-TS/'\n";
+  auto r = runInSandbox(kSlowServer,
+                        "vorntool logdump bb x >\"$VORN_ROOT/../out\" 2>\"$VORN_ROOT/../err\"; "
+                        "echo \"piped $? $(wc -l <\"$VORN_ROOT/../out\") $(wc -c <\"$VORN_ROOT/../err\")\"\n" +
+                        onTerminal({}, "", "", "sh -c 'exec vorntool logdump bb x 2>\"$VORN_ROOT/../err\"'") +
+                        shown + "echo \"stderr to a file $(wc -c <\"$VORN_ROOT/../err\")\"\n" +
+                        onTerminal({}, "TERM=dumb", "", "vorntool logdump bb x") + shown);
+  const std::string onScreen = "Baseband log collection: Success (Vorn running)^M\n"
+                               "Path = /var/wireless/Library/Logs/CrashReporter/Baseband/log-bb-TS.tar.gz^M\n";
+  EXPECT_EQ(r.out, "piped 0 2 0\n" + onScreen + "stderr to a file 0\n" + onScreen) << r.err;
 }
 
 }  // namespace
