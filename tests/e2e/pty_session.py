@@ -4,9 +4,12 @@
 
     pty_session.py [--stdout FILE] [--screen FILE] [--cols N] [--timeout S] STEPS -- COMMAND [ARG...]
 
-STEPS is a JSON list of ["send", text] and ["expect", regex]. An expectation
-waits, up to the timeout, for the regex to match the terminal's output that
-arrived after the previous match. After the last step the program must end
+STEPS is a JSON list of ["send", text] and ["expect", regex]. Keys are sent
+to a line editor: a send first waits, up to the timeout, until the editor
+has the terminal (canonical mode is off), since keys that come before are
+echoed by the terminal and again by the editor, and an end-of-file key may
+be lost. An expectation waits, up to the timeout, for the regex to match the
+terminal's output that arrived after the previous match. After the last step the program must end
 within the timeout. Everything the terminal showed is written to standard
 output. The exit status is the program's, or 99 (with the reason on standard
 error) when an expectation or the end did not come in time.
@@ -58,6 +61,14 @@ class Terminal:
             if not self.pump(deadline):
                 return True
         return False
+
+    def editing(self, timeout):
+        deadline = time.monotonic() + timeout
+        # No event says so: look again whenever output comes, or every 10 ms.
+        while termios.tcgetattr(self.master)[3] & termios.ICANON:
+            if time.monotonic() >= deadline or not self.pump(min(deadline, time.monotonic() + 0.01)):
+                return False
+        return True
 
     def expect(self, pattern, timeout):
         regex = re.compile(pattern.encode("utf-8"), re.DOTALL)
@@ -138,6 +149,10 @@ def main():
     terminal = Terminal(master)
     for kind, text in steps:
         if kind == "send":
+            if not terminal.editing(args.timeout):
+                child.kill()
+                child.wait()
+                return fail(terminal, "no line editor took the terminal before %r" % text)
             os.write(master, text.encode())
         elif not terminal.expect(text, args.timeout):
             child.kill()
