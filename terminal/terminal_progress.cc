@@ -92,8 +92,9 @@ void TerminalProgress::tickUntilStopped(std::stop_token stop) {
   }
 }
 
-std::shared_ptr<Progress> openProgress(const Facts& facts) {
+std::shared_ptr<Progress> openProgress(const Facts& facts, bool prompting) {
   if (!facts.errorIsTerminal || facts.dumb) return silentProgress();
+  if (prompting && !facts.inputIsTerminal && facts.outputIsTerminal) return silentProgress();
   return std::make_shared<TerminalProgress>(std::chrono::steady_clock::now, writeToStandardError,
                                             standardErrorWidth, /* ticker= */ true);
 }

@@ -69,7 +69,9 @@ class TerminalProgress final : public Progress {
 
 /// The terminal's line when standard error is a terminal that can move its
 /// cursor (TERM is not "dumb"), drawing on standard error; the silent one
-/// otherwise.
-std::shared_ptr<Progress> openProgress(const Facts& facts);
+/// otherwise. Silent as well for a prompt session whose commands come from a
+/// pipe or a file while standard output is a terminal: its plain prompt ends
+/// mid-line, right where the line would be drawn and cleared.
+std::shared_ptr<Progress> openProgress(const Facts& facts, bool prompting);
 
 }  // namespace terminal

@@ -37,7 +37,8 @@ void* RunShellThread(void* wordList) {
   const terminal::Facts facts = terminal::probe();
   colour::setEnabled(facts.colour);
   ToolContext context = ToolContext::onThisDevice({}, {});
-  context.progress = terminal::openProgress(facts);
+  // The program's name alone: the session prompts for its commands.
+  context.progress = terminal::openProgress(facts, /* prompting= */ words.size() <= 1);
   auto shell = std::make_shared<VornShell>(vorn::client::CreateManager, std::move(context));
   shell->setLineReader(terminal::openLineReader(facts, getprogname()));
   const bool ok = shell->run(words);

@@ -156,8 +156,7 @@ TEST(VorntoolProgress, TheTelephonyWaitIsGoneBeforeItsCompletionPrints) {
   auto r = runInSandbox(kSlowServer, onTerminal({
       expect(kPrompt), send("logdump bb x\r"), expect(kWaiting), expect(kPrompt),
       send("logdump tel x\r"), expect(kWaiting), expect(clearedBefore("Telephony log collection: Success")),
-      expect(kPrompt),
-      send("quit\r"),
+      expect(kPrompt), send("quit\r"),
   }, "", kScreenOption) + " >/dev/null; echo \"status $?\"\n" + kShowScreen);
   EXPECT_EQ(r.out, "status 0\n(/vorntool)>> logdump bb x\n" + kBasebandResult +
                        "(/vorntool)>> logdump tel x\n"
@@ -167,7 +166,7 @@ TEST(VorntoolProgress, TheTelephonyWaitIsGoneBeforeItsCompletionPrints) {
       << r.err;
 }
 
-TEST(VorntoolProgress, NothingIsDrawnIntoAFileOrOnADumbTerminal) {
+TEST(VorntoolProgress, NothingIsDrawnIntoAFileOnADumbTerminalOrOverAPlainPrompt) {
   // What the terminal got, control characters made visible.
   const std::string shown = " | cat -v | sed 's/log-bb-[-0-9]*/log-bb-TS/'\n";
   auto r = runInSandbox(kSlowServer,
@@ -175,10 +174,13 @@ TEST(VorntoolProgress, NothingIsDrawnIntoAFileOrOnADumbTerminal) {
                         "echo \"piped $? $(wc -l <\"$VORN_ROOT/../out\") $(wc -c <\"$VORN_ROOT/../err\")\"\n" +
                         onTerminal({}, "", "", "sh -c 'exec vorntool logdump bb x 2>\"$VORN_ROOT/../err\"'") +
                         shown + "echo \"stderr to a file $(wc -c <\"$VORN_ROOT/../err\")\"\n" +
-                        onTerminal({}, "TERM=dumb", "", "vorntool logdump bb x") + shown);
+                        onTerminal({}, "TERM=dumb", "", "vorntool logdump bb x") + shown +
+                        onTerminal({}, "", "", "sh -c 'echo logdump bb x | vorntool'") + shown);
   const std::string onScreen = "Baseband log collection: Success (Vorn running)^M\n"
                                "Path = /var/wireless/Library/Logs/CrashReporter/Baseband/log-bb-TS.tar.gz^M\n";
-  EXPECT_EQ(r.out, "piped 0 2 0\n" + onScreen + "stderr to a file 0\n" + onScreen) << r.err;
+  EXPECT_EQ(r.out, "piped 0 2 0\n" + onScreen + "stderr to a file 0\n" + onScreen + "(/vorntool)>> " +
+                       onScreen + "(/vorntool)>> ")
+      << r.err;
 }
 
 }  // namespace

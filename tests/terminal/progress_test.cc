@@ -185,23 +185,31 @@ TEST(AProgressLineOnItsOwnThread, DrawsWhileWaitingAndNeverAfterTheEnd) {
     EXPECT_THAT(writes[i], testing::StartsWith(kClear + "|/-\\"[i % 4] + " waiting for the server"));
 }
 
-TEST(OpenProgress, DrawsOnlyOnAStandardErrorThatIsATerminalAbleToMoveItsCursor) {
+TEST(OpenProgress, DrawsOnlyOnATerminalAbleToMoveItsCursorAndNeverOverAPrompt) {
   struct Case {
-    bool errorIsTerminal;
-    bool dumb;
+    bool input, output, error, dumb, prompting;
     bool draws;
   };
-  const Case cases[] = {{true, false, true}, {false, false, false}, {true, true, false}, {false, true, false}};
+  const Case cases[] = {
+      {true, true, true, false, false, true},     // one command at a terminal
+      {true, true, true, false, true, true},      // the editing prompt ends its line with the user's Enter
+      {false, false, true, false, true, true},    // commands piped in, output piped on: only the line is shown
+      {false, false, true, false, false, true},
+      {false, true, true, false, false, true},    // one command, nothing read
+      {false, true, true, false, true, false},    // the plain prompt shares the terminal's line
+      {true, true, false, false, false, false},   // standard error into a file or a pipe
+      {true, true, true, true, false, false},     // TERM=dumb
+  };
   for (const auto& c : cases) {
     terminal::Facts facts;
-    // The other streams play no part: a terminal on them draws nothing.
-    facts.inputIsTerminal = facts.outputIsTerminal = true;
-    facts.errorIsTerminal = c.errorIsTerminal;
+    facts.inputIsTerminal = c.input;
+    facts.outputIsTerminal = c.output;
+    facts.errorIsTerminal = c.error;
     facts.dumb = c.dumb;
-    auto progress = terminal::openProgress(facts);
-    EXPECT_EQ(dynamic_cast<TerminalProgress*>(progress.get()) != nullptr, c.draws)
-        << c.errorIsTerminal << c.dumb;
-    EXPECT_EQ(progress == silentProgress(), !c.draws);
+    auto progress = terminal::openProgress(facts, c.prompting);
+    const std::string which = testing::PrintToString(std::vector<bool>{c.input, c.output, c.error, c.dumb, c.prompting});
+    EXPECT_EQ(dynamic_cast<TerminalProgress*>(progress.get()) != nullptr, c.draws) << which;
+    EXPECT_EQ(progress == silentProgress(), !c.draws) << which;
   }
 }
 
