@@ -3,8 +3,8 @@
 
 #include <utility>
 
-CommandBase::CommandBase(std::string name, std::weak_ptr<CommandBase> parent)
-    : parent(std::move(parent)), name(std::move(name)) {}
+CommandBase::CommandBase(std::string commandName, std::weak_ptr<CommandBase> parentCommand)
+    : parent(std::move(parentCommand)), name(std::move(commandName)) {}
 
 void CommandBase::init() {
   // The parent stays locked until registration is over, so children created
@@ -18,39 +18,40 @@ void CommandBase::init() {
 
 bool CommandBase::isAllowed(std::string) { return true; }
 
-void CommandBase::addCommandHandler(std::string name, CommandHandler handler, std::string help) {
+void CommandBase::addCommandHandler(std::string handlerName, CommandHandler handler, std::string help) {
   if (!handler) return;
-  handlers.insert_or_assign(name, std::move(handler));
-  if (!help.empty()) helpTexts.insert_or_assign(std::move(name), std::move(help));
+  handlers.insert_or_assign(handlerName, std::move(handler));
+  if (!help.empty()) helpTexts.insert_or_assign(std::move(handlerName), std::move(help));
 }
 
-void CommandBase::addCommandHandler(std::string name, CommandHandler handler, std::string help,
+void CommandBase::addCommandHandler(std::string handlerName, CommandHandler handler,
+                                    std::string help,
                                     OptionWords options) {
   if (!handler) return;
-  optionWords.insert_or_assign(name, std::move(options));
-  addCommandHandler(std::move(name), std::move(handler), std::move(help));
+  optionWords.insert_or_assign(handlerName, std::move(options));
+  addCommandHandler(std::move(handlerName), std::move(handler), std::move(help));
 }
 
-void CommandBase::addSubCommand(std::string name, std::shared_ptr<CommandBase> command) {
-  if (command) subCommands.insert_or_assign(std::move(name), std::move(command));
+void CommandBase::addSubCommand(std::string commandName, std::shared_ptr<CommandBase> command) {
+  if (command) subCommands.insert_or_assign(std::move(commandName), std::move(command));
 }
 
-void CommandBase::addUnlistedSubCommand(std::string name, std::shared_ptr<CommandBase> command) {
-  if (command) unlistedSubCommands.insert_or_assign(std::move(name), std::move(command));
+void CommandBase::addUnlistedSubCommand(std::string commandName, std::shared_ptr<CommandBase> command) {
+  if (command) unlistedSubCommands.insert_or_assign(std::move(commandName), std::move(command));
 }
 
-std::shared_ptr<CommandBase> CommandBase::getSubCommandObj(std::string name) {
-  if (auto found = subCommands.find(name); found != subCommands.end()) return found->second;
-  if (auto found = unlistedSubCommands.find(name); found != unlistedSubCommands.end())
+std::shared_ptr<CommandBase> CommandBase::getSubCommandObj(std::string commandName) {
+  if (auto found = subCommands.find(commandName); found != subCommands.end()) return found->second;
+  if (auto found = unlistedSubCommands.find(commandName); found != unlistedSubCommands.end())
     return found->second;
   return nullptr;
 }
 
-bool CommandBase::isValidSubCommand(std::string name) {
-  return subCommands.contains(name) || unlistedSubCommands.contains(name);
+bool CommandBase::isValidSubCommand(std::string commandName) {
+  return subCommands.contains(commandName) || unlistedSubCommands.contains(commandName);
 }
 
-bool CommandBase::isValidCommand(std::string name) { return handlers.contains(name); }
+bool CommandBase::isValidCommand(std::string commandName) { return handlers.contains(commandName); }
 
 std::string CommandBase::getHierarchy() { return hierarchy; }
 
@@ -75,8 +76,8 @@ OptionWords CommandBase::getOptionWords(const std::string& handler) const {
   return found == optionWords.end() ? OptionWords{} : found->second;
 }
 
-bool CommandBase::execCommand(std::string name, std::list<std::string> args) {
-  auto found = handlers.find(name);
+bool CommandBase::execCommand(std::string commandName, std::list<std::string> args) {
+  auto found = handlers.find(commandName);
   if (found == handlers.end()) return false;
   dispatch::group group;
   // The handler is copied so that it lives through the call even if it

@@ -28,9 +28,9 @@ std::shared_ptr<LogdumpCommand> LogdumpCommand::create(std::string name,
   return command;
 }
 
-bool LogdumpCommand::isAllowed(std::string name) {
+bool LogdumpCommand::isAllowed(std::string commandName) {
   // Baseband logs can still be located while the server is down.
-  if (name == "bb") return true;
+  if (commandName == "bb") return true;
   if (IsServerRunning()) return true;
   std::cerr << kServerDownErrorPrint << std::endl;
   // The server may well be running: the bus would not let the tool ask it.

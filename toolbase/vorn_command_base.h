@@ -20,12 +20,14 @@ class VornCommandBase : public CommandBase {
 
  protected:
   /// With this machine's device and helper service.
-  VornCommandBase(std::string name, std::weak_ptr<CommandBase> parent,
+  VornCommandBase(std::string commandName, std::weak_ptr<CommandBase> parentCommand,
                   std::shared_ptr<vorn::client::Manager> manager, dispatch::queue queue)
-      : VornCommandBase(std::move(name), std::move(parent),
+      : VornCommandBase(std::move(commandName), std::move(parentCommand),
                         ToolContext::onThisDevice(std::move(manager), std::move(queue))) {}
-  VornCommandBase(std::string name, std::weak_ptr<CommandBase> parent, ToolContext context)
-      : CommandBase(std::move(name), std::move(parent)), context(std::move(context)) {}
+  VornCommandBase(std::string commandName, std::weak_ptr<CommandBase> parentCommand,
+                  ToolContext toolContext)
+      : CommandBase(std::move(commandName), std::move(parentCommand)),
+        context(std::move(toolContext)) {}
 
   ToolContext context;
 };

@@ -327,7 +327,7 @@ const Failure kFailures[] = {
 INSTANTIATE_TEST_SUITE_P(
     Calls, CallFailure,
     ::testing::Combine(::testing::ValuesIn(kFailures), ::testing::Values(Caller::sync, Caller::async, Caller::helper)),
-    [](const auto& info) { return std::string(std::get<0>(info.param).name) + kCallers[int(std::get<1>(info.param))]; });
+    [](const auto& paramInfo) { return std::string(std::get<0>(paramInfo.param).name) + kCallers[int(std::get<1>(paramInfo.param))]; });
 
 TEST_F(ClientOverBus, RefusesCallersThatThePolicyDeniesAndSaysSo) {
   Peer server(false, Act::answer), helper(true, Act::answer);

@@ -182,6 +182,6 @@ TEST_P(CompletionScripts, OfferFileNamesForTheExportsOutputPath) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Shells, CompletionScripts, testing::Values("bash", "zsh"),
-                         [](const auto& info) { return info.param; });
+                         [](const auto& paramInfo) { return paramInfo.param; });
 
 }  // namespace

@@ -23,8 +23,8 @@ class OpenCommand : public CommandBase {
   void registerCommands() override {}
 
  private:
-  OpenCommand(std::string name, std::weak_ptr<CommandBase> parent)
-      : CommandBase(std::move(name), std::move(parent)) {}
+  OpenCommand(std::string commandName, std::weak_ptr<CommandBase> parentCommand)
+      : CommandBase(std::move(commandName), std::move(parentCommand)) {}
 };
 
 std::string help(CommandBase& node) {

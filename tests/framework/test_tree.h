@@ -28,9 +28,9 @@ class TestCommand : public CommandBase {
     return node;
   }
 
-  bool isAllowed(std::string name) override {
+  bool isAllowed(std::string commandName) override {
     for (auto& r : layout_.refused)
-      if (r == name) return false;
+      if (r == commandName) return false;
     return true;
   }
 
@@ -54,8 +54,8 @@ class TestCommand : public CommandBase {
   }
 
  private:
-  TestCommand(Layout layout, std::weak_ptr<CommandBase> parent, std::vector<std::string>* calls)
-      : CommandBase(layout.name, std::move(parent)), layout_(std::move(layout)), calls_(calls) {}
+  TestCommand(Layout layout, std::weak_ptr<CommandBase> parentCommand, std::vector<std::string>* calls)
+      : CommandBase(layout.name, std::move(parentCommand)), layout_(std::move(layout)), calls_(calls) {}
   Layout layout_;
   std::vector<std::string>* calls_;
 };

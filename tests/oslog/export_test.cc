@@ -62,8 +62,8 @@ TEST_P(AStreamEnding, SucceedsWhateverTheReasonAndLogsAbnormalOnes) {
 
 INSTANTIATE_TEST_SUITE_P(Reasons, AStreamEnding,
                          testing::Values(logstore::kReasonEnded, logstore::kReasonReadError, std::uint64_t{1234}),
-                         [](const testing::TestParamInfo<std::uint64_t>& info) {
-                           return "Reason" + std::to_string(info.param);
+                         [](const testing::TestParamInfo<std::uint64_t>& paramInfo) {
+                           return "Reason" + std::to_string(paramInfo.param);
                          });
 
 TEST_F(AnExportOverAFakeStore, TimeoutInvalidatesFailsAndKeepsThePartialFile) {
@@ -169,7 +169,7 @@ INSTANTIATE_TEST_SUITE_P(
         ParseCase{"NonNumericHistoryIsZero", {"abc", "a"}, {0, "a", kDefaults, {"ZelmarBaseband"}}},
         ParseCase{"HistoryReadLikeAtoi", {"  -12xyz", "a", "-p"}, {-12, "a", {}, {}}},
         ParseCase{"PositionalWordsMayStartWithDash", {"-p", "-i", "-p", "x"}, {0, "-i", {"x"}, {}}}),
-    [](const testing::TestParamInfo<ParseCase>& info) { return std::string(info.param.name); });
+    [](const testing::TestParamInfo<ParseCase>& paramInfo) { return std::string(paramInfo.param.name); });
 
 TEST(OsLogCommand, FewerThanTwoWordsFailsOnStandardOutput) {
   for (const Words& words : {Words{}, Words{"600"}}) {

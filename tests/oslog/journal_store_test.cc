@@ -99,7 +99,7 @@ INSTANTIATE_TEST_SUITE_P(
         FilterCase{"NoTermsNoFilter", {"-p"},
                    {"Telhub", "telhub", "TelhubMobileHelper", "TelhubRootHelper", "TelhubRootHelperd",
                     "ZelmarBasebandd", "zélmartool", "pwrkeepd", "systemd", "sshd", "cron", "kworker/0:1"}}),
-    [](const testing::TestParamInfo<FilterCase>& info) { return std::string(info.param.name); });
+    [](const testing::TestParamInfo<FilterCase>& paramInfo) { return std::string(paramInfo.param.name); });
 
 TEST_F(AnExportFromTheJournal, MapsJournalFieldsOntoTheLineFromTheStartDateOn) {
   auto lines = exportLines({}, {}, 48 * 3600.0);  // the fixture spans the 24 hours before it was made

@@ -64,7 +64,7 @@ INSTANTIATE_TEST_SUITE_P(
         LineCase{"WestOffsetCrossesNewYear", at(1767225600LL * 1000000 + 999999, -3600),
                  "2025-12-31 23:00:00 +0000 " + kTail},
         LineCase{"LeapDay", at(1709164800LL * 1000000, 0), "2024-02-29 00:00:00 +0000 " + kTail}),
-    [](const testing::TestParamInfo<LineCase>& info) { return std::string(info.param.name); });
+    [](const testing::TestParamInfo<LineCase>& paramInfo) { return std::string(paramInfo.param.name); });
 
 // An event's zone is the local zone at the event's own date, daylight saving included.
 TEST(LocalSecondsFromGMT, FollowsTheZoneAtTheEventsDate) {

@@ -136,7 +136,7 @@ TEST_P(WaitingCaller, IsCollectedForOnlyWhileItStaysOnTheBus) {
 
 INSTANTIATE_TEST_SUITE_P(Daemons, WaitingCaller,
                          ::testing::Values(Departure{"Stays", false, 3}, Departure{"Leaves", true, 2}),
-                         [](const auto& info) { return std::string(info.param.label); });
+                         [](const auto& paramInfo) { return std::string(paramInfo.param.label); });
 
 TEST_F(Daemons, StartingRemovesWhatAKilledRunLeftHalfWritten) {
   write("var/wireless/Library/Logs/CrashReporter/Baseband/.log-bb-2020-01-01-000000.tar.gz.partial", "half");

@@ -268,7 +268,7 @@ TEST_P(CollectionForms, SparseFilesAreStoredByWhatTheyHold) {
 INSTANTIATE_TEST_SUITE_P(Collector, CollectionForms,
                          ::testing::Values(Form{"TarGz", Compression::tarGz}, Form{"Tar", Compression::tar},
                                            Form{"Folder", Compression::none}),
-                         [](const auto& info) { return std::string(info.param.name); });
+                         [](const auto& paramInfo) { return std::string(paramInfo.param.name); });
 
 TEST_F(CollectorTest, TheSizeLimitCutsWhatIsBeyondItAndTheManifestSaysSo) {
   for (const char* name : {"a.log", "b.log", "c.log"}) write(logs() / name, noise(6000, name[0]));

@@ -59,7 +59,7 @@ INSTANTIATE_TEST_SUITE_P(
                       Line{"BadFail", {"--fail", "TraceDumpState"}, OptionsVerdict::error,
                            "--fail wants COMMAND=STATUS", true},
                       Line{"ExitOn", {"--exit-on=Hello"}, OptionsVerdict::run, "", true}),
-    [](const auto& info) { return std::string(info.param.label); });
+    [](const auto& paramInfo) { return std::string(paramInfo.param.label); });
 
 TEST(ManagerCommandLine, TakesTheRootFromTheOptionThenTheEnvironmentThenSlash) {
   ManagerOptions options;

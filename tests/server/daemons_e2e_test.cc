@@ -81,4 +81,4 @@ INSTANTIATE_TEST_SUITE_P(
         // must not compress below it.
         Failure{"NoRoom", "var/lib/vorn/modem/ram.bin", noise(1 << 20),
                 {"/bin/sh", "-c", "ulimit -f 256 && exec \"$0\" \"$@\"", VORND_PATH}}),
-    [](const auto& info) { return std::string(info.param.label); });
+    [](const auto& paramInfo) { return std::string(paramInfo.param.label); });

@@ -94,7 +94,7 @@ INSTANTIATE_TEST_SUITE_P(Server, GzipMembers,
                                            Stream{"ExactBlocks", 4 * 4096, 4096, 2, 4096, 4},
                                            Stream{"ManyBlocksFewThreads", 100 * 4096 + 5, 4096, 1, 10000, 101},
                                            Stream{"ManyBlocksManyThreads", 100 * 4096 + 5, 4096, 4, 333, 101}),
-                         [](const auto& info) { return std::string(info.param.label); });
+                         [](const auto& paramInfo) { return std::string(paramInfo.param.label); });
 
 TEST(GzipMembersFailure, AFullDiskFailsTheStream) {
   StringSink sink(10000);

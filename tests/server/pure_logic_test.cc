@@ -106,7 +106,7 @@ INSTANTIATE_TEST_SUITE_P(
                     std::nullopt, ""},
         RequestCase{"UnknownAction", {action("CollectEverything")}, std::nullopt, ""},
         RequestCase{"NoAction", {reason("r")}, std::nullopt, ""}),
-    [](const auto& info) { return std::string(info.param.label); });
+    [](const auto& paramInfo) { return std::string(paramInfo.param.label); });
 
 TEST(SnapshotScan, FindsTheNewestBasebandSnapshotByTimestamp) {
   struct Case {
