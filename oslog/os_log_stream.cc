@@ -9,6 +9,7 @@
 #include "oslog/export_file.h"
 #include "oslog/line_formatter.h"
 #include "platform/logstore/system_log.h"
+#include "platform/linux/errno_text.h"
 
 namespace {
 
@@ -106,7 +107,8 @@ bool OsLogStream::putOsLogStreamToFile(logstore::Store& store, const std::string
   // invalidate() has stopped the stream's thread, so the file is ours again.
   const bool written = state->file.close();
   if (!written)
-    logError("Failed to write file: %s (%s)", path.c_str(), std::strerror(state->file.writeError()));
+    logError("Failed to write file: %s (%s)", path.c_str(),
+             vorn::errnoText(state->file.writeError()).c_str());
   stream.reset();
   if (observer) observer->finished();
   return ended && written;

@@ -24,7 +24,7 @@ std::unique_ptr<LineReader> openLineReader(const Facts& facts, const std::string
                                     std::getenv("HOME"));
   // Multibyte input needs the user's character set. Set here, before the
   // session starts any other thread.
-  std::setlocale(LC_CTYPE, "");
+  std::setlocale(LC_CTYPE, "");  // NOLINT(concurrency-mt-unsafe): see above
   return std::make_unique<EditLineReader>(std::move(options));
 }
 

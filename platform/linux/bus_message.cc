@@ -27,7 +27,7 @@ const char* signatureOf(const xpc::object& v) {
 
 bool appendText(sd_bus_message* m, const std::string& text) {
   // sd-bus takes C strings: an embedded NUL would silently cut the text.
-  if (std::memchr(text.data(), '\0', text.size())) return false;
+  if (text.find('\0') != std::string::npos) return false;
   return sd_bus_message_append_basic(m, 's', text.c_str()) >= 0;
 }
 

@@ -12,6 +12,7 @@
 
 #include "server/common/gzip_members.h"
 #include "server/common/output_policy.h"
+#include "platform/linux/errno_text.h"
 
 namespace vorn::server {
 
@@ -26,8 +27,6 @@ constexpr size_t kSparseNameLimit = 100;
 struct EntryFree {
   void operator()(archive_entry* e) const { archive_entry_free(e); }
 };
-
-std::string errnoText(const std::string& what, int err) { return what + ": " + std::strerror(err); }
 
 bool hasHoles(const StoredPart& part) {
   off_t covered = 0;

@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: MIT
 #include "server/common/byte_sink.h"
+#include "platform/linux/errno_text.h"
 
 #include <unistd.h>
 
@@ -14,7 +15,7 @@ bool FdByteSink::write(const void* data, size_t size) {
     ssize_t n = ::write(fd_, p, size);
     if (n < 0 && errno == EINTR) continue;
     if (n <= 0) {
-      error_ = n < 0 ? std::strerror(errno) : "no room";
+      error_ = n < 0 ? errnoText(errno) : "no room";
       break;
     }
     p += n;

@@ -23,6 +23,7 @@
 #include "server/common/source_walk.h"
 #include "server/common/timestamp_naming.h"
 #include "server/common/tree_removal.h"
+#include "platform/linux/errno_text.h"
 
 namespace vorn::server {
 
@@ -108,7 +109,7 @@ CollectOutcome Collector::collect(const CollectRequest& request, const std::atom
   Fd folder = openFolder(folderPath);
   Fd root = openFolder(root_);
   if (!folder || !root) {
-    outcome.error = "cannot open " + (folder ? root_ : folderPath) + ": " + std::strerror(errno);
+    outcome.error = "cannot open " + (folder ? root_ : folderPath) + ": " + errnoText(errno);
     return outcome;
   }
   removePartialLeftovers(folder.get());

@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: MIT
 #include "server/common/daemon_loop.h"
+#include "platform/linux/errno_text.h"
 
 #include <signal.h>
 
@@ -10,7 +11,7 @@ namespace vorn::server {
 
 namespace {
 
-std::string sdError(const std::string& what, int r) { return what + ": " + std::strerror(-r); }
+std::string sdError(const std::string& what, int r) { return what + ": " + errnoText(-r); }
 
 int onTimer(sd_event_source* s, uint64_t, void* userdata) {
   auto* fn = static_cast<std::function<void()>*>(userdata);

@@ -78,6 +78,7 @@ OptionsVerdict walk(const char* program, const std::vector<std::string>& args, c
   opterr = 0;
   for (;;) {
     const int previous = optind == 0 ? 1 : optind;
+    // NOLINTNEXTLINE(concurrency-mt-unsafe): options are read before any thread starts
     const int c = getopt_long(int(words.size()), argv.data(), "+:", table.data(), nullptr);
     if (c == -1) break;
     const std::string word = words[static_cast<size_t>(std::min<int>(previous, int(words.size()) - 1))];

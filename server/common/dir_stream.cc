@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: MIT
 #include "server/common/dir_stream.h"
+#include "platform/linux/errno_text.h"
 
 #include <unistd.h>
 
@@ -11,7 +12,7 @@ namespace vorn::server {
 DirStream::DirStream(int fd) {
   dir_ = ::fdopendir(fd);
   if (dir_ == nullptr) {
-    error_ = std::strerror(errno);
+    error_ = errnoText(errno);
     if (fd >= 0) ::close(fd);
     return;
   }
@@ -32,7 +33,7 @@ bool DirStream::next(std::string* name) {
     errno = 0;
     const dirent* e = ::readdir(dir_);
     if (e == nullptr) {
-      if (errno != 0) error_ = std::strerror(errno);
+      if (errno != 0) error_ = errnoText(errno);
       return false;
     }
     if (std::strcmp(e->d_name, ".") == 0 || std::strcmp(e->d_name, "..") == 0) continue;

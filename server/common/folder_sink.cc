@@ -10,14 +10,13 @@
 
 #include "server/common/output_policy.h"
 #include "server/common/tree_removal.h"
+#include "platform/linux/errno_text.h"
 
 namespace vorn::server {
 
 namespace {
 
 constexpr size_t kCopyBytes = 256 * 1024;
-
-std::string errnoText(const std::string& what, int err) { return what + ": " + std::strerror(err); }
 
 }  // namespace
 

@@ -8,6 +8,7 @@
 #include <cstring>
 
 #include "server/common/text_util.h"
+#include "platform/linux/errno_text.h"
 
 namespace vorn::server {
 
@@ -24,7 +25,7 @@ bool Manifest::open(int dirFd, const std::string& fallbackName, std::string* err
   if (!fd_) {
     fd_.reset(::openat(dirFd, fallbackName.c_str(), O_RDWR | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
     if (!fd_) {
-      *error = "cannot create the manifest: " + std::string(std::strerror(errno));
+      *error = "cannot create the manifest: " + errnoText(errno);
       return false;
     }
     ::unlinkat(dirFd, fallbackName.c_str(), 0);
@@ -69,7 +70,7 @@ bool Manifest::flush() {
     ssize_t n = ::write(fd_.get(), buffer_.data() + done, buffer_.size() - done);
     if (n < 0 && errno == EINTR) continue;
     if (n <= 0) {
-      error_ = "cannot write the manifest: " + std::string(n < 0 ? std::strerror(errno) : "no room");
+      error_ = "cannot write the manifest: " + std::string(n < 0 ? errnoText(errno) : "no room");
       break;
     }
     done += static_cast<size_t>(n);

@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: MIT
 #include "server/common/output_policy.h"
+#include "platform/linux/errno_text.h"
 
 #include <grp.h>
 #include <unistd.h>
@@ -22,12 +23,12 @@ std::optional<gid_t> outputGroup() {
 bool applyOutputPolicy(int fd, mode_t mode, std::optional<gid_t> group, const std::string& what,
                        std::string* error) {
   if (group && ::fchown(fd, static_cast<uid_t>(-1), *group) != 0) {
-    *error = "cannot give " + what + " to the group vorn: " + std::strerror(errno);
+    *error = "cannot give " + what + " to the group vorn: " + errnoText(errno);
     return false;
   }
   // After the chown, which may clear set-id bits but never adds any.
   if (::fchmod(fd, mode) != 0) {
-    *error = "cannot set the mode of " + what + ": " + std::strerror(errno);
+    *error = "cannot set the mode of " + what + ": " + errnoText(errno);
     return false;
   }
   return true;

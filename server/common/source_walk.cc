@@ -9,6 +9,7 @@
 
 #include "platform/linux/fd.h"
 #include "server/common/dir_stream.h"
+#include "platform/linux/errno_text.h"
 
 namespace vorn::server {
 
@@ -38,8 +39,6 @@ const char* raceReason(int err) {
     default: return nullptr;
   }
 }
-
-std::string errnoText(const std::string& what, int err) { return what + ": " + std::strerror(err); }
 
 }  // namespace
 

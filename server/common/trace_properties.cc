@@ -9,6 +9,7 @@
 #include <system_error>
 
 #include "platform/protocol/protocol.h"
+#include "platform/linux/errno_text.h"
 
 namespace vorn::server {
 
@@ -57,7 +58,7 @@ TraceProperties loadTraceProperties(const std::string& root, std::string* error)
     if (err == ENOENT) {
       saveTraceProperties(path, props, error);
     } else {
-      *error = "cannot read " + path + ": " + std::strerror(err);
+      *error = "cannot read " + path + ": " + errnoText(err);
     }
     return props;
   }

@@ -48,7 +48,7 @@ int main(int argc, char** argv) {
   // A refused request may be tens of megabytes; with a fixed threshold such
   // buffers are mapped and unmapped, rather than raising glibc's moving one
   // and staying in the heap for good.
-  mallopt(M_MMAP_THRESHOLD, 4 << 20);
+  mallopt(M_MMAP_THRESHOLD, 4 << 20);  // NOLINT(concurrency-mt-unsafe): no thread runs yet
   // A full disk or a file-size limit must fail a collection, not kill us.
   signal(SIGXFSZ, SIG_IGN);
   signal(SIGPIPE, SIG_IGN);
