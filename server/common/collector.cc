@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: MIT
 #include "server/common/collector.h"
+#include "server/common/snapshot_scan.h"
 
 #include <fcntl.h>
 #include <unistd.h>
@@ -72,10 +73,6 @@ Fd openFolder(const std::string& path) {
 }
 
 }  // namespace
-
-std::string snapshotFolder(const std::string& root) {
-  return protocol::underRoot(root, trace::kSnapshotFolder);
-}
 
 std::string directorySuffix(CollectAction action, int vendor) {
   switch (action) {

@@ -16,9 +16,6 @@
 /// are never more open than their sources (see output_policy.h).
 namespace vorn::server {
 
-/// The snapshot folder under the platform root.
-std::string snapshotFolder(const std::string& root);
-
 /// Directory suffix for `action` with the given radio vendor code.
 std::string directorySuffix(CollectAction action, int vendor);
 

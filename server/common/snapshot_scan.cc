@@ -8,6 +8,10 @@
 
 namespace vorn::server {
 
+std::string snapshotFolder(const std::string& root) {
+  return protocol::underRoot(root, trace::kSnapshotFolder);
+}
+
 namespace fs = std::filesystem;
 
 std::optional<std::string> newestTimestamp(const std::vector<std::string>& names, const std::string& suffix) {

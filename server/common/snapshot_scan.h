@@ -5,8 +5,12 @@
 #include <string>
 #include <vector>
 
-/// Finds the newest baseband snapshot directory, for the helper service.
+/// Where collections go, and the newest baseband snapshot directory there,
+/// for the helper service.
 namespace vorn::server {
+
+/// The snapshot folder under the platform root.
+std::string snapshotFolder(const std::string& root);
 
 /// Among `names` (directory names), the timestamp of the newest
 /// "log-bb-<TS><suffix>". Newest by timestamp order, not by modification

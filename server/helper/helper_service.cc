@@ -4,7 +4,6 @@
 #include "platform/protocol/protocol.h"
 #include "platform/linux/bus_guard.h"
 #include "platform/linux/bus_message.h"
-#include "server/common/collector.h"
 #include "server/common/device_facts.h"
 #include "server/common/snapshot_scan.h"
 

@@ -12,6 +12,7 @@
 #include <sstream>
 
 #include "server/common/collector.h"
+#include "server/common/snapshot_scan.h"
 #include "server/common/tree_removal.h"
 #include "tests/server/collection_reader.h"
 
