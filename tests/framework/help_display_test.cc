@@ -1,71 +1,41 @@
 // SPDX-License-Identifier: MIT
 #include <gtest/gtest.h>
 
-#include "stdio_capture.h"
 #include "test_tree.h"
 
 namespace {
 
-const std::string kNavigation =
-    "\t              cd  -  <sub-command>\n"
-    "\t            help\n"
-    "\t            back\n"
-    "\t            quit\n"
-    "\n";
-
-std::string header(const std::string& name) {
-  return "\nOptions for command '\x1b[32m" + name + "\x1b[39m':\n\n";
-}
-
-std::string helpOf(const TestCommand::Layout& layout) {
-  auto node = TestCommand::create(layout, {}, nullptr);
-  StdioCapture io;
-  node->displayHelp();
-  return io.out();
-}
-
-TEST(HelpDisplay, RootListsSubCommandUsageAndNavigation) {
-  TestCommand::Layout layout{"vorntool", {}, {{"logdump", {{"tel", "t"}, {"bb", ""}, {"oslog", "o"}, {"core", "c"}}, {}, {}}}, {}};
-  EXPECT_EQ(helpOf(layout), header("vorntool") +
-                              "\t         logdump  -  [bb|core|oslog|tel]\n"
-                              "\n" +
-                              kNavigation);
-}
-
-TEST(HelpDisplay, HandlersWithAndWithoutHelpTextsInByteOrder) {
-  TestCommand::Layout layout{"logdump",
-                         {{"tel", "collect telephony logs"},
-                          {"bb", ""},
-                          {"Zed", "upper case sorts first"},
-                          {"averyveryverylongname", "long"},
-                          {"te", "prefix sorts before longer name"}},
-                         {},
-                         {}};
-  EXPECT_EQ(helpOf(layout), header("logdump") +
-                              "\t             Zed  -  upper case sorts first\n\n"
-                              "\taveryveryverylongname  -  long\n\n"
-                              "\t              bb  -  ...\n\n"
-                              "\t              te  -  prefix sorts before longer name\n\n"
-                              "\t             tel  -  collect telephony logs\n\n" +
-                              kNavigation);
-}
-
-TEST(HelpDisplay, EmptyNodeShowsOnlyHeaderAndNavigation) {
-  EXPECT_EQ(helpOf({"lonely", {}, {}, {}}), header("lonely") + kNavigation);
-}
-
-TEST(HelpDisplay, NestedUsageIndentsGrandchildrenAndSkipsHandlerlessNodes) {
-  TestCommand::Layout grandchild{"deep", {{"x", "hidden"}}, {}, {}};
-  TestCommand::Layout withHandlers{"logdump", {{"tel", ""}}, {grandchild}, {}};
-  TestCommand::Layout withoutHandlers{"group", {}, {grandchild}, {}};
-  TestCommand::Layout root{"vorntool", {}, {withHandlers, withoutHandlers}, {}};
-  EXPECT_EQ(helpOf(root), header("vorntool") +
-                              "\t                     <deep>  -  [x]\n"
-                              "\n"
-                              "\t         logdump  -  [tel]\n"
-                              "\t                     <deep>  -  [x]\n"
-                              "\n" +
-                              kNavigation);
+TEST(HelpDisplay, ListsHandlersThenSubCommandUsageThenNavigationByteForByte) {
+  const TestCommand::Layout grandchild{"deep", {{"x", "hidden"}}};
+  const struct {
+    TestCommand::Layout node;
+    std::string body;  // between the header and the navigation lines
+  } cases[] = {
+      {{"lonely"}, ""},
+      {{"vorntool", {}, {{"logdump", {{"tel", "t"}, {"bb", ""}, {"oslog", "o"}, {"core", "c"}}}}},
+       "\t         logdump  -  [bb|core|oslog|tel]\n\n"},
+      // Byte order; no help text shows "..."; a long name is not cut.
+      {{"logdump",
+        {{"tel", "collect telephony logs"}, {"bb", ""}, {"Zed", "upper case sorts first"},
+         {"averyveryverylongname", "long"}, {"te", "prefix sorts before longer name"}}},
+       "\t             Zed  -  upper case sorts first\n\n"
+       "\taveryveryverylongname  -  long\n\n"
+       "\t              bb  -  ...\n\n"
+       "\t              te  -  prefix sorts before longer name\n\n"
+       "\t             tel  -  collect telephony logs\n\n"},
+      // Grandchildren are indented; a node without handlers has no line.
+      {{"vorntool", {}, {{"logdump", {{"tel", ""}}, {grandchild}}, {"group", {}, {grandchild}}}},
+       "\t                     <deep>  -  [x]\n"
+       "\n"
+       "\t         logdump  -  [tel]\n"
+       "\t                     <deep>  -  [x]\n"
+       "\n"},
+  };
+  for (const auto& c : cases) {
+    EXPECT_EQ(helpOf(*TestCommand::create(c.node)),
+              "\nOptions for command '\x1b[32m" + c.node.name + "\x1b[39m':\n\n" + c.body +
+                  "\t              cd  -  <sub-command>\n\t            help\n\t            back\n\t            quit\n\n");
+  }
 }
 
 }  // namespace

@@ -7,7 +7,7 @@
 
 namespace {
 
-const TestCommand::Layout kTree{"vorntool", {}, {{"logdump", {{"tel", ""}}, {}, {}}}, {}};
+const TestCommand::Layout kTree{"vorntool", {}, {{"logdump", {{"tel", ""}}}}};
 
 /// Plays typed lines and records each prompt together with what completion
 /// offered for an empty line at that prompt.

@@ -1,14 +1,17 @@
 // SPDX-License-Identifier: MIT
 #pragma once
 
-#include <functional>
-#include <map>
+#include <algorithm>
 #include <memory>
 #include <string>
 #include <vector>
 
 #include "framework/command_base.h"
 #include "framework/command_shell.h"
+#include "stdio_capture.h"
+
+/// A handler that does nothing and succeeds.
+inline const CommandHandler kSucceed = [](dispatch::group, std::list<std::string>) { return true; };
 
 /// A node whose handlers and children are given as data, for driving the
 /// framework without the tool.
@@ -16,31 +19,28 @@ class TestCommand : public CommandBase {
  public:
   struct Layout {
     std::string name;
-    std::vector<std::pair<std::string, std::string>> handlers;  // name, help
-    std::vector<Layout> children;
-    std::vector<std::string> refused;  // names isAllowed refuses
+    std::vector<std::pair<std::string, std::string>> handlers = {};  // name, help
+    std::vector<Layout> children = {};
+    std::vector<std::string> refused = {};  // names isAllowed refuses
   };
 
-  static std::shared_ptr<TestCommand> create(Layout layout, std::weak_ptr<CommandBase> parent,
-                                             std::vector<std::string>* calls) {
+  static std::shared_ptr<TestCommand> create(Layout layout, std::weak_ptr<CommandBase> parent = {},
+                                             std::vector<std::string>* calls = nullptr) {
     auto node = std::shared_ptr<TestCommand>(new TestCommand(std::move(layout), parent, calls));
     node->init();
     return node;
   }
 
   bool isAllowed(std::string commandName) override {
-    for (auto& r : layout_.refused)
-      if (r == commandName) return false;
-    return true;
+    return std::find(layout_.refused.begin(), layout_.refused.end(), commandName) == layout_.refused.end();
   }
 
   void registerCommands() override {
     for (auto& [handler, help] : layout_.handlers) {
       std::string label = layout_.name + ":" + handler;
-      auto* calls = calls_;
       addCommandHandler(
           handler,
-          [label, calls](dispatch::group, std::list<std::string> args) {
+          [label, calls = calls_](dispatch::group, std::list<std::string> args) {
             std::string call = label;
             for (auto it = args.rbegin(); it != args.rend(); ++it) call += " " + *it;
             if (calls) calls->push_back(call);
@@ -49,8 +49,7 @@ class TestCommand : public CommandBase {
           },
           help);
     }
-    for (auto& child : layout_.children)
-      addSubCommand(child.name, create(child, weak_from_this(), calls_));
+    for (auto& child : layout_.children) addSubCommand(child.name, create(child, weak_from_this(), calls_));
   }
 
  private:
@@ -60,7 +59,7 @@ class TestCommand : public CommandBase {
   std::vector<std::string>* calls_;
 };
 
-/// A shell over a tree made from a layout.
+/// A shell over a tree made from a layout; none for a layout without a name.
 class TestShell : public CommandShell {
  public:
   explicit TestShell(TestCommand::Layout layout, std::vector<std::string>* calls = nullptr)
@@ -74,3 +73,10 @@ class TestShell : public CommandShell {
   TestCommand::Layout layout_;
   std::vector<std::string>* calls_;
 };
+
+/// What displayHelp prints for `node`.
+inline std::string helpOf(CommandBase& node) {
+  StdioCapture io;
+  node.displayHelp();
+  return io.out();
+}
