@@ -40,9 +40,7 @@ TEST(ProgressText, SaysWhatIsGoingOnAndForHowLong) {
       {Activity::waitingForServer, 3s, 0, 8, "| waiting for the server\u2026 3 s"},
       {Activity::exporting, 0ns, 0, 0, "exporting\u2026 0 entries, 0/s, 0 s"},
       {Activity::exporting, 100ms, 1, 0, "exporting\u2026 1 entry, 10/s, 0 s"},
-      {Activity::exporting, 100ms, 61200, 0, "exporting\u2026 61,200 entries, 612k/s, 0 s"},
       {Activity::exporting, 2017ms, 1234567, 3, "exporting\u2026 1,234,567 entries, 612k/s, 2 s"},
-      {Activity::exporting, 4s, 10000000, 0, "exporting\u2026 10,000,000 entries, 2.5M/s, 4 s"},
       {Activity::exporting, 1ns, UINT64_MAX, 0,
        "exporting\u2026 18,446,744,073,709,551,615 entries, 1000000000000.0M/s, 0 s"},
   };
@@ -52,17 +50,15 @@ TEST(ProgressText, SaysWhatIsGoingOnAndForHowLong) {
 
 TEST(ProgressText, NumbersAreGroupedAndRatesShortAndRoundedDown) {
   const std::pair<std::uint64_t, const char*> grouped[] = {
-      {0, "0"}, {999, "999"}, {1000, "1,000"}, {123456, "123,456"}, {1234567, "1,234,567"}};
+      {999, "999"}, {1000, "1,000"}, {123456, "123,456"}, {1234567, "1,234,567"}};
   for (const auto& [n, text] : grouped) EXPECT_EQ(terminal::groupedDigits(n), text);
   const std::pair<double, const char*> rates[] = {
-      {-5, "0/s"},         {0.9, "0/s"},          {999.9, "999/s"},   {1000, "1k/s"},
-      {612999, "612k/s"},  {999999.9, "999k/s"},  {1e6, "1.0M/s"},    {2599999, "2.5M/s"}};
+      {-5, "0/s"}, {999.9, "999/s"}, {1000, "1k/s"}, {999999.9, "999k/s"}, {1e6, "1.0M/s"}, {2599999, "2.5M/s"}};
   for (const auto& [rate, text] : rates) EXPECT_EQ(terminal::rateText(rate), text) << rate;
 }
 
 TEST(ProgressText, IsCutToTheColumnsWithoutBreakingACharacter) {
   const std::string text = "| waiting for the server\u2026 12 s";
-  EXPECT_EQ(terminal::fitColumns(text, 100), text);
   EXPECT_EQ(terminal::fitColumns(text, 30), text);
   EXPECT_EQ(terminal::fitColumns(text, 29), "| waiting for the server\u2026 12 ");
   EXPECT_EQ(terminal::fitColumns(text, 25), "| waiting for the server\u2026");
@@ -73,10 +69,9 @@ TEST(ProgressText, IsCutToTheColumnsWithoutBreakingACharacter) {
 /// A progress line with a clock the test moves and a screen it reads.
 class AProgressLine : public testing::Test {
  protected:
-  void advance(std::chrono::nanoseconds by) { now_ += by; }
   /// Moves the clock, then lets the line draw if it is due.
   void tickAfter(std::chrono::nanoseconds by) {
-    advance(by);
+    now_ += by;
     line_.tick();
   }
   std::vector<std::string> takeWrites() { return std::exchange(writes_, {}); }
@@ -88,14 +83,6 @@ class AProgressLine : public testing::Test {
                          [this](std::string_view bytes) { writes_.emplace_back(bytes); },
                          [this] { return width_; }, /* ticker= */ false};
 };
-
-TEST_F(AProgressLine, AQuickAnswerDrawsNothingAtAll) {
-  line_.begin(Activity::waitingForServer);
-  tickAfter(99ms);
-  line_.end();
-  tickAfter(1s);
-  EXPECT_THAT(writes_, IsEmpty());
-}
 
 TEST_F(AProgressLine, RedrawsInPlaceAtMostTenTimesASecond) {
   line_.begin(Activity::waitingForServer);
@@ -112,7 +99,12 @@ TEST_F(AProgressLine, RedrawsInPlaceAtMostTenTimesASecond) {
   EXPECT_THAT(takeWrites(), ElementsAre(kClear + "- waiting for the server\u2026 12 s"));
 }
 
-TEST_F(AProgressLine, EndClearsWhatWasDrawnOnceAndDrawsNothingAfter) {
+TEST_F(AProgressLine, DrawsNothingForAQuickAnswerAndClearsALineOnceAtItsEnd) {
+  line_.begin(Activity::waitingForServer);
+  tickAfter(99ms);
+  line_.end();
+  tickAfter(1s);
+  EXPECT_THAT(takeWrites(), IsEmpty());
   line_.begin(Activity::waitingForServer);
   tickAfter(200ms);
   takeWrites();
@@ -122,21 +114,6 @@ TEST_F(AProgressLine, EndClearsWhatWasDrawnOnceAndDrawsNothingAfter) {
   line_.setCount(5);
   tickAfter(1s);
   EXPECT_THAT(takeWrites(), ElementsAre(kClear));
-}
-
-TEST_F(AProgressLine, AnExportShowsTheCountItIsGivenAndItsRate) {
-  line_.begin(Activity::exporting);
-  advance(50ms);
-  line_.setCount(30000);
-  tickAfter(50ms);
-  line_.setCount(61200);
-  tickAfter(100ms);
-  line_.setCount(1234567);
-  advance(1817ms);
-  line_.tick();
-  EXPECT_THAT(takeWrites(), ElementsAre(kClear + "exporting\u2026 30,000 entries, 300k/s, 0 s",
-                                        kClear + "exporting\u2026 61,200 entries, 306k/s, 0 s",
-                                        kClear + "exporting\u2026 1,234,567 entries, 612k/s, 2 s"));
 }
 
 TEST_F(AProgressLine, ANewActivityStartsItsTimeAndCountAfresh) {
@@ -194,22 +171,17 @@ TEST(OpenProgress, DrawsOnlyOnATerminalAbleToMoveItsCursorAndNeverOverAPrompt) {
       {true, true, true, false, false, true},     // one command at a terminal
       {true, true, true, false, true, true},      // the editing prompt ends its line with the user's Enter
       {false, false, true, false, true, true},    // commands piped in, output piped on: only the line is shown
-      {false, false, true, false, false, true},
       {false, true, true, false, false, true},    // one command, nothing read
       {false, true, true, false, true, false},    // the plain prompt shares the terminal's line
       {true, true, false, false, false, false},   // standard error into a file or a pipe
       {true, true, true, true, false, false},     // TERM=dumb
   };
   for (const auto& c : cases) {
-    terminal::Facts facts;
-    facts.inputIsTerminal = c.input;
-    facts.outputIsTerminal = c.output;
-    facts.errorIsTerminal = c.error;
-    facts.dumb = c.dumb;
-    auto progress = terminal::openProgress(facts, c.prompting);
-    const std::string which = testing::PrintToString(std::vector<bool>{c.input, c.output, c.error, c.dumb, c.prompting});
-    EXPECT_EQ(dynamic_cast<TerminalProgress*>(progress.get()) != nullptr, c.draws) << which;
-    EXPECT_EQ(progress == silentProgress(), !c.draws) << which;
+    auto progress = terminal::openProgress(
+        {.inputIsTerminal = c.input, .outputIsTerminal = c.output, .errorIsTerminal = c.error, .dumb = c.dumb},
+        c.prompting);
+    EXPECT_EQ(dynamic_cast<TerminalProgress*>(progress.get()) != nullptr, c.draws) << &c - cases;
+    EXPECT_EQ(progress == silentProgress(), !c.draws) << &c - cases;
   }
 }
 
