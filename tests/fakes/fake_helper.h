@@ -10,7 +10,6 @@
 class FakeHelper : public vorn::HelperClient {
  public:
   struct Call {
-    std::string client;
     unsigned task;
     std::string command;
     xpc::object request;
@@ -18,11 +17,11 @@ class FakeHelper : public vorn::HelperClient {
   std::int32_t status = 0;
   xpc::object response;  // replaces the caller's dictionary when not null
   std::vector<Call> calls;
-  std::string client;
+  std::string client;  // the name the last client was made with
 
   TelephonyXPC::Result perform(vorn::helper::TaskID task, const char* command, xpc::dict request,
                                xpc::dict& reply) override {
-    calls.push_back({client, static_cast<unsigned>(task), command, request.obj()});
+    calls.push_back({static_cast<unsigned>(task), command, request.obj()});
     if (!response.isNull()) reply = xpc::dict(response);
     return {status, ""};
   }

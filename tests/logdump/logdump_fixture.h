@@ -17,15 +17,17 @@
 /// A logdump command wired to a scripted server, device and helper service.
 class LogdumpTest : public testing::Test {
  protected:
-  /// The fixture's device and helper service, with `server` as the manager.
-  ToolContext contextWith(std::shared_ptr<FakeManager> server) {
-    auto helpers = [this](const char* client, std::shared_ptr<rilx::LogServer>)
-        -> std::shared_ptr<vorn::HelperClient> {
-      if (!helperAvailable) return nullptr;
+  void SetUp() override { restart(); }
+
+  /// Starts over with a new scripted server and `progress` as the line.
+  void restart(std::shared_ptr<Progress> progress = silentProgress()) {
+    manager = std::make_shared<FakeManager>(queue);
+    auto helpers = [this](const char* client, std::shared_ptr<rilx::LogServer>) {
       helper->client = client;
-      return helper;
+      return helperAvailable ? std::shared_ptr<vorn::HelperClient>(helper) : nullptr;
     };
-    return {.manager = std::move(server), .queue = queue, .device = profile, .helpers = helpers};
+    command = LogdumpCommand::create(
+        "logdump", {}, {.manager = manager, .queue = queue, .device = profile, .helpers = helpers, .progress = progress});
   }
 
   struct Run {
@@ -34,9 +36,8 @@ class LogdumpTest : public testing::Test {
     std::string err;
   };
   Run run(const std::string& handler, std::list<std::string> typed) {
-    std::list<std::string> words(typed.rbegin(), typed.rend());
     StdioCapture io;
-    bool result = command->execCommand(handler, words);
+    const bool result = command->execCommand(handler, {typed.rbegin(), typed.rend()});
     return {result, io.out(), io.err()};
   }
 
@@ -53,8 +54,8 @@ class LogdumpTest : public testing::Test {
   std::shared_ptr<FakeHelper> helper = std::make_shared<FakeHelper>();
   bool helperAvailable = true;
   dispatch::queue queue{"vorntool.queue"};
-  std::shared_ptr<FakeManager> manager = std::make_shared<FakeManager>(queue);
-  std::shared_ptr<LogdumpCommand> command = LogdumpCommand::create("logdump", {}, contextWith(manager));
+  std::shared_ptr<FakeManager> manager;
+  std::shared_ptr<LogdumpCommand> command;
 };
 
 inline const std::string kSnapshot = vorn::trace::kSnapshotFolder;

@@ -23,47 +23,32 @@ struct MarkedProgress : Progress {
   std::vector<std::uint64_t> counts;
 };
 
-class AHandlersProgress : public LogdumpTest {
- protected:
-  AHandlersProgress() {
-    ToolContext context = contextWith(manager);
-    context.progress = progress;
-    command = LogdumpCommand::create("logdump", {}, std::move(context));
-    manager->answer("GetTraceProperty", property("1"));
-  }
-  std::shared_ptr<MarkedProgress> progress = std::make_shared<MarkedProgress>();
-};
+using AHandlersProgress = LogdumpTest;
 
 TEST_F(AHandlersProgress, EndsBeforeTheResultIsPrinted) {
   struct Case {
-    const char* what;
     std::string handler;
-    FakeManager::Answer enabledAnswer;
+    FakeManager::Answer enabled;
     FakeManager::Answer dump;
     std::string firstLine;
   };
   const std::vector<Case> cases = {
-      {"tel", "tel", property("1"), timestamp("T"), "Telephony log collection: Success"},
-      {"tel failed", "tel", property("1"), {vorn::status::kCollectionFailed, object()},
-       "Telephony log collection: Failed"},
-      {"core", "core", property("1"), timestamp("T"), "Telephony log collection with Coredump: Success"},
-      {"bb", "bb", property("1"), timestamp("T"), "Baseband log collection: Success (Vorn running)"},
-      {"bb, enabled check failed", "bb", {vorn::status::kNoReply, object()}, {},
-       "Baseband log collection: Failed"},
-      {"bb, not enabled", "bb", property("0"), {}, "Baseband logs are not enabled"},
-      {"bb, dump failed", "bb", property("1"), {vorn::status::kCollectionFailed, object()},
-       "Baseband log collection: Failed"},
-      {"bb, server down", "bb", property("1"), {kResultServerNotRunning, object()},
-       "Baseband log collection: Success (Vorn not running)"},
+      {"tel", property("1"), timestamp("T"), "Telephony log collection: Success"},
+      {"bb", property("1"), timestamp("T"), "Baseband log collection: Success (Vorn running)"},
+      {"bb", {vorn::status::kNoReply, object()}, {}, "Baseband log collection: Failed"},
+      {"bb", property("0"), {}, "Baseband logs are not enabled"},
+      {"bb", property("1"), {vorn::status::kCollectionFailed, object()}, "Baseband log collection: Failed"},
+      {"bb", property("1"), {kResultServerNotRunning, object()}, "Baseband log collection: Success (Vorn not running)"},
   };
   // The helper is asked too when the server is down.
   device->buildKind = platform::BuildKind::internal;
   for (const auto& c : cases) {
-    manager->answer("GetTraceProperty", c.enabledAnswer, "Baseband");
+    restart(std::make_shared<MarkedProgress>());
+    manager->answer("GetTraceProperty", c.enabled);
     manager->answer("TraceDumpState", c.dump);
     const auto r = run(c.handler, {"x"});
-    EXPECT_THAT(r.out, testing::StartsWith("[waiting][end]" + c.firstLine + "\n")) << c.what;
-    EXPECT_EQ(r.out.find('[', 1), r.out.find("[end]")) << c.what << ": one line, ended once";
+    EXPECT_THAT(r.out, testing::StartsWith("[waiting][end]" + c.firstLine + "\n")) << &c - cases.data();
+    EXPECT_EQ(r.out.find('[', 1), r.out.find("[end]")) << &c - cases.data() << ": one line, ended once";
   }
 }
 

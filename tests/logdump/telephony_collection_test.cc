@@ -5,20 +5,18 @@ namespace {
 
 using xpc::object;
 
-object telRequest(const std::string& reason, std::int64_t compression, bool nonui) {
-  std::vector<xpc::entry> e{{"TraceAction", object::string("CollectTelephonyLogs")},
-                            {"TraceDumpStateReason", object::string(reason)},
-                            {"TraceDumpStatePerformCompression", object::int64(compression)}};
-  if (nonui) e.emplace_back("TraceUserConfirmation", object::boolean(false));
-  return object::dictionary(e);
-}
-
-object coreRequest(const std::string& reason, std::int64_t compression, bool nonui) {
-  std::vector<xpc::entry> e{{"BasebandResetType", object::string("Hard")},
-                            {"BasebandResetSubType", object::string("OtherErrors")},
-                            {"TraceAction", object::string("CollectTelephonyLogsWithCoredump")},
-                            {"BasebandResetReason", object::string(reason)},
-                            {"TraceDumpStatePerformCompression", object::int64(compression)}};
+/// The TraceDumpState request of `handler` ("tel" or "core").
+object dumpRequest(const std::string& handler, const std::string& reason, std::int64_t compression, bool nonui) {
+  std::vector<xpc::entry> e;
+  if (handler == "tel") {
+    e = {{"TraceAction", object::string("CollectTelephonyLogs")}, {"TraceDumpStateReason", object::string(reason)}};
+  } else {
+    e = {{"BasebandResetType", object::string("Hard")},
+         {"BasebandResetSubType", object::string("OtherErrors")},
+         {"TraceAction", object::string("CollectTelephonyLogsWithCoredump")},
+         {"BasebandResetReason", object::string(reason)}};
+  }
+  e.emplace_back("TraceDumpStatePerformCompression", object::int64(compression));
   if (nonui) e.emplace_back("TraceUserConfirmation", object::boolean(false));
   return object::dictionary(e);
 }
@@ -26,7 +24,7 @@ object coreRequest(const std::string& reason, std::int64_t compression, bool non
 const object kModeQuery = object::dictionary(
     {{"TraceName", object::string("SystemLogs")}, {"TracePropertyName", object::string("Mode")}});
 
-class TelephonyCollection : public LogdumpTest {};
+using TelephonyCollection = LogdumpTest;
 
 TEST_F(TelephonyCollection, RequestsCarryExactlyTheirEntries) {
   struct Case {
@@ -34,28 +32,25 @@ TEST_F(TelephonyCollection, RequestsCarryExactlyTheirEntries) {
     std::list<std::string> typed;
     std::string mode;  // the system-logs trace mode the server reports
     object expected;
-    bool asksMode;
   };
   const std::vector<Case> cases = {
-      {"tel", {}, "1", telRequest("[vorntool] User triggered", 1, false), true},
-      {"tel", {"nonui", "x"}, "1", telRequest("[vorntool] x", 1, true), true},
-      {"tel", {"tar", "crash"}, "3", telRequest("[vorntool] crash", 0, false), true},
-      {"tel", {"tar"}, "0x3", telRequest("[vorntool] User triggered", 0, false), true},
-      {"tel", {"tar"}, "3 ", telRequest("[vorntool] User triggered", 2, false), true},
-      {"core", {"nocompress"}, "3", coreRequest("[vorntool] User triggered", 0, false), false},
-      {"core", {"tar", "NONUI", "why", "nocompress"}, "3", coreRequest("[vorntool] why", 2, true), false},
+      {"tel", {}, "1", dumpRequest("tel", "[vorntool] User triggered", 1, false)},
+      {"tel", {"nonui", "x"}, "1", dumpRequest("tel", "[vorntool] x", 1, true)},
+      {"tel", {"tar", "crash"}, "3", dumpRequest("tel", "[vorntool] crash", 0, false)},
+      {"tel", {"tar"}, "0x3", dumpRequest("tel", "[vorntool] User triggered", 0, false)},
+      {"tel", {"tar"}, "3 ", dumpRequest("tel", "[vorntool] User triggered", 2, false)},
+      // Only "tel" asks for the trace mode.
+      {"core", {"nocompress"}, "3", dumpRequest("core", "[vorntool] User triggered", 0, false)},
+      {"core", {"tar", "NONUI", "why", "nocompress"}, "3", dumpRequest("core", "[vorntool] why", 2, true)},
   };
   for (const auto& c : cases) {
-    auto fresh = std::make_shared<FakeManager>(queue);
-    fresh->answer("GetTraceProperty", property(c.mode));
-    auto cmd = LogdumpCommand::create("logdump", {}, contextWith(fresh));
-    std::list<std::string> words(c.typed.rbegin(), c.typed.rend());
-    StdioCapture io;
-    EXPECT_TRUE(cmd->execCommand(c.handler, words));
-    auto requests = fresh->requests();
-    const std::size_t dumpAt = c.asksMode ? 1 : 0;
+    restart();
+    manager->answer("GetTraceProperty", property(c.mode));
+    EXPECT_TRUE(run(c.handler, c.typed).result);
+    auto requests = manager->requests();
+    const std::size_t dumpAt = c.handler == "tel" ? 1 : 0;
     ASSERT_EQ(requests.size(), dumpAt + 1) << c.handler;
-    if (c.asksMode) {
+    if (dumpAt == 1) {
       EXPECT_EQ(requests[0].command, "GetTraceProperty");
       EXPECT_EQ(requests[0].request, kModeQuery);
       EXPECT_FALSE(requests[0].async);
@@ -82,12 +77,9 @@ TEST_F(TelephonyCollection, CompletionPrintsResultAndPath) {
       {"core", {"nocompress"}, withTs,
        "Telephony log collection with Coredump: Success\nPath = " + kSnapshot +
            "log-bb-2026-11-23-101500-coredump\n"},
-      {"core", {"tar"}, withTs,
-       "Telephony log collection with Coredump: Success\nPath = " + kSnapshot + "log-bb-2026-11-23-101500.tar\n"},
       {"tel", {}, {0, object::dictionary({{"TimestampString", object::int64(5)}})},
        "Telephony log collection: Success\nPath = " + kSnapshot + "log-bb-.tar.gz\n"},
       {"tel", {}, {0, object::string("not a dictionary")}, "Telephony log collection: Success\n"},
-      {"core", {}, {0, object()}, "Telephony log collection with Coredump: Success\n"},
       {"tel", {}, {kResultServerNotRunning, withTs.response}, "Telephony log collection: Failed\n"},
       {"core", {}, {vorn::status::kNoReply, object()}, "Telephony log collection with Coredump: Failed\n"},
   };
