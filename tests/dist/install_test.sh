@@ -34,6 +34,14 @@ check() {
   shift
   if "$@"; then ok "$what"; else not_ok "$what"; fi
 }
+# has FILE LINE...: passes when FILE holds every LINE whole.
+has() {
+  local file="$1" line
+  shift
+  for line; do
+    grep -qx -- "$line" "$file" || { echo "# $file lacks: $line"; return 1; }
+  done
+}
 skip() {
   echo "skip - $*"
   exit 77
@@ -83,19 +91,15 @@ EOF
   check "every folder is 0755${actual:+ (not: $actual)}" test -z "$actual"
 
   local units="$tree/lib/systemd/system" libexec="$prefix/libexec/vorn"
-  check "vornd.service runs the installed vornd" grep -qx "ExecStart=$libexec/vornd" "$units/vornd.service"
-  check "vornd.service waits for org.vorn.Manager" \
-    grep -qx "BusName=org.vorn.Manager" "$units/vornd.service"
-  check "vornd.service starts with the system" grep -qx "WantedBy=multi-user.target" "$units/vornd.service"
+  check "vornd.service runs the installed vornd, waits for org.vorn.Manager and starts with the system" \
+    has "$units/vornd.service" "ExecStart=$libexec/vornd" "BusName=org.vorn.Manager" "WantedBy=multi-user.target"
   check "vorn-helper.service runs the installed helper" \
-    grep -qx "ExecStart=$libexec/vorn-helper" "$units/vorn-helper.service"
+    has "$units/vorn-helper.service" "ExecStart=$libexec/vorn-helper"
   check "vorn-helper.service is only started on demand" \
     bash -c '! grep -q "^\[Install\]" "$1"' _ "$units/vorn-helper.service"
-  local activation="$tree/share/dbus-1/system-services/org.vorn.Helper.service"
-  check "the activation file names org.vorn.Helper" grep -qx "Name=org.vorn.Helper" "$activation"
-  check "the bus starts it through vorn-helper.service" \
-    grep -qx "SystemdService=vorn-helper.service" "$activation"
-  check "the activation file's Exec is the installed helper" grep -qx "Exec=$libexec/vorn-helper" "$activation"
+  check "the bus starts the installed helper as org.vorn.Helper through vorn-helper.service" \
+    has "$tree/share/dbus-1/system-services/org.vorn.Helper.service" "Name=org.vorn.Helper" \
+    "SystemdService=vorn-helper.service" "Exec=$libexec/vorn-helper"
   check "no activation file for vornd, whose absence the tool reports" \
     test ! -e "$tree/share/dbus-1/system-services/org.vorn.Manager.service"
 
