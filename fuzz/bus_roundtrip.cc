@@ -50,7 +50,7 @@ xpc::object withoutNulls(const xpc::object& v) {
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   FuzzedDataProvider in(data, size);
-  const xpc::object sent = fuzz::XpcFromBytes(in, {}, kMaxNesting + 2).object();
+  const xpc::object sent = fuzz::objectFromBytes(in, {}, kMaxNesting + 2);
   auto m = fuzz::newOfflineMessage();
   FUZZ_CHECK(m);
   // Anything but a dictionary goes as an empty one.

@@ -6,14 +6,12 @@
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   FuzzedDataProvider in(data, size);
-  const xpc::object request =
-      fuzz::XpcFromBytes(in,
-                         {vorn::kKeyTraceAction, vorn::kCollectTelephonyLogs, vorn::kCollectTelephonyLogsWithCoredump,
-                          vorn::kCollectBasebandLogs, vorn::kKeyTraceDumpStateReason,
-                          vorn::kKeyTraceDumpStatePerformCompression, vorn::kKeyBasebandResetReason,
-                          vorn::kKeyTraceUserConfirmation},
-                         /* maxDepth= */ 3)
-          .object();
+  const xpc::object request = fuzz::objectFromBytes(
+      in,
+      {vorn::kKeyTraceAction, vorn::kCollectTelephonyLogs, vorn::kCollectTelephonyLogsWithCoredump,
+       vorn::kCollectBasebandLogs, vorn::kKeyTraceDumpStateReason, vorn::kKeyTraceDumpStatePerformCompression,
+       vorn::kKeyBasebandResetReason, vorn::kKeyTraceUserConfirmation},
+      /* maxDepth= */ 3);
   const auto parsed = vorn::server::parseCollectRequest(request);
   if (!parsed) return 0;
   // A request that was taken names its action and, when it gives a reason,

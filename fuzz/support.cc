@@ -32,29 +32,27 @@ bool validUtf8(std::string_view utf8, bool (*accept)(std::int32_t)) {
   return true;
 }
 
-std::string XpcFromBytes::text() {
-  const auto pick = in_.ConsumeIntegral<std::uint8_t>();
-  if (pick < words_.size()) return std::string(words_[pick]);
-  return in_.ConsumeRandomLengthString(64);
-}
-
-xpc::object XpcFromBytes::object(int depth) {
+xpc::object objectFromBytes(FuzzedDataProvider& in, const std::vector<std::string_view>& words, int maxDepth) {
   constexpr std::size_t kMaxItems = 6;
-  switch (in_.ConsumeIntegralInRange(0, depth < maxDepth_ ? 7 : 5)) {
+  auto text = [&] {
+    const auto pick = in.ConsumeIntegral<std::uint8_t>();
+    return pick < words.size() ? std::string(words[pick]) : in.ConsumeRandomLengthString(64);
+  };
+  switch (in.ConsumeIntegralInRange(0, maxDepth > 0 ? 7 : 5)) {
     case 0: return {};
     case 1: return xpc::object::string(text());
-    case 2: return xpc::object::int64(in_.ConsumeIntegral<std::int64_t>());
-    case 3: return xpc::object::uint64(in_.ConsumeIntegral<std::uint64_t>());
-    case 4: return xpc::object::boolean(in_.ConsumeBool());
-    case 5: return xpc::object::dbl(std::bit_cast<double>(in_.ConsumeIntegral<std::uint64_t>()));
+    case 2: return xpc::object::int64(in.ConsumeIntegral<std::int64_t>());
+    case 3: return xpc::object::uint64(in.ConsumeIntegral<std::uint64_t>());
+    case 4: return xpc::object::boolean(in.ConsumeBool());
+    case 5: return xpc::object::dbl(std::bit_cast<double>(in.ConsumeIntegral<std::uint64_t>()));
     case 6: {
-      std::vector<xpc::object> items(in_.ConsumeIntegralInRange<std::size_t>(0, kMaxItems));
-      for (auto& item : items) item = object(depth + 1);
+      std::vector<xpc::object> items(in.ConsumeIntegralInRange<std::size_t>(0, kMaxItems));
+      for (auto& item : items) item = objectFromBytes(in, words, maxDepth - 1);
       return xpc::object::array(std::move(items));
     }
     default: {
-      std::vector<xpc::entry> entries(in_.ConsumeIntegralInRange<std::size_t>(0, kMaxItems));
-      for (auto& [key, value] : entries) key = text(), value = object(depth + 1);
+      std::vector<xpc::entry> entries(in.ConsumeIntegralInRange<std::size_t>(0, kMaxItems));
+      for (auto& [key, value] : entries) key = text(), value = objectFromBytes(in, words, maxDepth - 1);
       return xpc::object::dictionary(std::move(entries));
     }
   }

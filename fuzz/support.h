@@ -35,21 +35,10 @@ std::vector<std::string> wordsOf(std::string_view text);
 /// reads it) and `accept`, when given, takes each of its code points.
 bool validUtf8(std::string_view utf8, bool (*accept)(std::int32_t codePoint) = nullptr);
 
-/// Message objects of every kind, nested up to `maxDepth` containers. Texts
+/// A message object of any kind, nested up to `maxDepth` containers. Texts
 /// are sometimes taken from `words` (keys and values a parser looks for),
 /// which random bytes would rarely spell.
-class XpcFromBytes {
- public:
-  XpcFromBytes(FuzzedDataProvider& in, std::vector<std::string_view> words, int maxDepth)
-      : in_(in), words_(std::move(words)), maxDepth_(maxDepth) {}
-  xpc::object object(int depth = 0);
-
- private:
-  std::string text();
-  FuzzedDataProvider& in_;
-  std::vector<std::string_view> words_;
-  int maxDepth_;
-};
+xpc::object objectFromBytes(FuzzedDataProvider& in, const std::vector<std::string_view>& words, int maxDepth);
 
 /// Equal, with doubles compared bit for bit: a NaN must arrive as the same
 /// NaN, though it equals nothing.

@@ -1,21 +1,10 @@
 #!/usr/bin/env bash
 # SPDX-License-Identifier: MIT
-#
-# What `cmake --install` puts in a staging folder, checked step by step:
-#
-#   install_test.sh STEP BUILD_DIR STAGE PREFIX VERSION
-#
-#   stage    install the build into STAGE (DESTDIR)
-#   files    the exact file list with modes, the paths inside the files,
-#            `vorntool --version`, and the libraries each program needs
-#   system   systemd-analyze verify and security on the units, and what
-#            sysusers.d and tmpfiles.d make
-#   manuals  every manual page renders without a warning
-#   sandbox  a collection, an export and a bus-activated helper, all from
-#            the installed tree
-#
-# Exits 0 when every check of the step passed, 77 when the step cannot run
-# here (the reason is printed), 1 otherwise.
+# install_test.sh STEP BUILD_DIR STAGE PREFIX VERSION: one step of checking
+# what `cmake --install` puts in a staging folder (stage, files, system,
+# manuals, sandbox; each step function says what it checks). Exits 0 when
+# every check passed, 77 when the step cannot run here (the reason is
+# printed), 1 otherwise.
 set -uo pipefail
 
 readonly step="$1" build="$2" stage="$3" prefix="$4" version="$5"

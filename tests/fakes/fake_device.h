@@ -1,14 +1,12 @@
 // SPDX-License-Identifier: MIT
 #pragma once
 
-#include <mutex>
 #include <set>
 #include <string>
-#include <vector>
 
 #include "platform/device.h"
 
-/// A device described by the test, remembering which processes were asked for.
+/// A device described by the test.
 class FakeDevice : public platform::DeviceInfo {
  public:
   int radioKind = 1;
@@ -21,18 +19,5 @@ class FakeDevice : public platform::DeviceInfo {
   int product() override { return productCode; }
   int vendor() override { return vendorCode; }
   platform::BuildKind build() override { return buildKind; }
-  bool isProcessRunning(const std::string& name) override {
-    std::lock_guard lock(mutex_);
-    asked_.push_back(name);
-    return running.contains(name);
-  }
-  std::vector<std::string> asked() {
-    std::lock_guard lock(mutex_);
-    return asked_;
-  }
-
- private:
-  std::mutex mutex_;
-  std::vector<std::string> asked_;
+  bool isProcessRunning(const std::string& name) override { return running.contains(name); }
 };
-
