@@ -31,6 +31,14 @@ has() {
     grep -qx -- "$line" "$file" || { echo "# $file lacks: $line"; return 1; }
   done
 }
+# same DESCRIPTION EXPECTED ACTUAL: passes when the texts are equal, and
+# shows how they differ when not.
+same() {
+  if [[ "$3" == "$2" ]]; then ok "$1"; else
+    not_ok "$1"
+    diff <(printf '%s\n' "$2") <(printf '%s\n' "$3") | sed 's/^/#   /'
+  fi
+}
 skip() {
   echo "skip - $*"
   exit 77
@@ -69,13 +77,8 @@ share/man/man8/vornd.8.gz 644
 share/zsh/vendor-completions/_vorntool 644
 EOF
 )"
-  actual="$(cd "$stage" && find . -mindepth 1 ! -type d -printf '%P %m\n' | sort)"
-  if [[ "$actual" == "$(sed "s|^|${prefix#/}/|" <<<"$expected")" ]]; then
-    ok "the installed files and their modes"
-  else
-    not_ok "the installed files and their modes"
-    diff <(sed "s|^|${prefix#/}/|" <<<"$expected") <(printf '%s\n' "$actual") | sed 's/^/#   /'
-  fi
+  same "the installed files and their modes" "$(sed "s|^|${prefix#/}/|" <<<"$expected")" \
+    "$(cd "$stage" && find . -mindepth 1 ! -type d -printf '%P %m\n' | sort)"
   actual="$(cd "$stage" && find . -mindepth 1 -type d ! -perm 755 -printf '%P %m\n')"
   check "every folder is 0755${actual:+ (not: $actual)}" test -z "$actual"
 
@@ -194,12 +197,7 @@ Baseband log collection: Success (Vorn not running)
 Path = ${snapshot}log-bb-2026-01-02-030405-bb-trace
 status 0
 helper: $tree/libexec/vorn/vorn-helper"
-  if [[ "$out" == "$expected" ]]; then
-    ok "a collection, an export and the bus-started helper from the installed tree"
-  else
-    not_ok "a collection, an export and the bus-started helper from the installed tree"
-    diff <(printf '%s\n' "$expected") <(printf '%s\n' "$out") | sed 's/^/#   /'
-  fi
+  same "a collection, an export and the bus-started helper from the installed tree" "$expected" "$out"
   finish
 }
 

@@ -58,17 +58,12 @@ TEST(ShellLineReader, OneShotSessionsNeverRead) {
   EXPECT_TRUE(seen.empty());
 }
 
-/// Colour off for the test's duration.
-class ColourOff : public testing::Test {
- protected:
-  void SetUp() override { colour::setEnabled(false); }
-  void TearDown() override { colour::setEnabled(true); }
-};
-
-TEST_F(ColourOff, HelpAndTheInvalidWordReportKeepTheirTextWithoutEscapes) {
+TEST(ColourOff, HelpAndTheInvalidWordReportKeepTheirTextWithoutEscapes) {
   TestShell shell(kTree);
+  colour::setEnabled(false);
   StdioCapture io;
   EXPECT_FALSE(shell.run({"bogus", "vorntool"}));
+  colour::setEnabled(true);
   EXPECT_EQ(io.out(),
             "\nInvalid command option 'bogus'\n"
             "Options for command 'vorntool':\n\n"
