@@ -47,8 +47,8 @@ TEST_F(AHandlersProgress, EndsBeforeTheResultIsPrinted) {
     manager->answer("GetTraceProperty", c.enabled);
     manager->answer("TraceDumpState", c.dump);
     const auto r = run(c.handler, {"x"});
-    EXPECT_THAT(r.out, testing::StartsWith("[waiting][end]" + c.firstLine + "\n")) << &c - cases.data();
-    EXPECT_EQ(r.out.find('[', 1), r.out.find("[end]")) << &c - cases.data() << ": one line, ended once";
+    EXPECT_THAT(r.out, testing::StartsWith("[waiting][end]" + c.firstLine + "\n")) << c.handler;
+    EXPECT_EQ(r.out.find('[', 1), r.out.find("[end]")) << c.firstLine << ": one line, ended once";
   }
 }
 
