@@ -46,21 +46,16 @@ class ContentFromBytes {
     const char* sig = kSignatures[in_.ConsumeIntegralInRange(0, depth <= kMaxNesting + 1 ? 16 : 12)];
     open('v', sig);
     xpc::object value;
-    const auto number = in_.ConsumeIntegral<std::uint64_t>();  // read as each basic type reads it
+    // One value, read as each basic type reads it.
+    const auto number = in_.ConsumeIntegral<std::uint64_t>();
+    const int truth = number & 1;
+    const double real = std::bit_cast<double>(number);
     switch (sig[0]) {
       case 's': value = xpc::object::string(text()), basic('s', value.asString()->c_str()); break;
       case 'x': value = xpc::object::int64(static_cast<std::int64_t>(number)), basic('x', &number); break;
       case 't': value = xpc::object::uint64(number), basic('t', &number); break;
-      case 'b': {
-        const int truth = number & 1;
-        value = xpc::object::boolean(truth != 0), basic('b', &truth);
-        break;
-      }
-      case 'd': {
-        const auto real = std::bit_cast<double>(number);
-        value = xpc::object::dbl(real), basic('d', &real);
-        break;
-      }
+      case 'b': value = xpc::object::boolean(truth != 0), basic('b', &truth); break;
+      case 'd': value = xpc::object::dbl(real), basic('d', &real); break;
       case 'o': basic('o', number & 1 ? "/" : "/org/vorn/x"); break;
       case 'g': basic('g', "a{sv}(av)"); break;
       case 'v': variant(depth + 1); break;
