@@ -162,6 +162,7 @@ step_manuals() {
 
 step_sandbox() {
   local out
+  [[ $EUID -eq 0 ]] || skip "the sandbox makes PID and mount namespaces, which needs root"
   # Paths are device paths; the snapshot is made before vornd stops, and
   # only the helper can name it then.
   out="$(timeout -k 5 120 "$repo/scripts/vorn-sandbox" --prefix "$tree" -- bash -c '

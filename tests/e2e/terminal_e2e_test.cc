@@ -7,6 +7,10 @@
 
 namespace {
 
+using VorntoolColour = InTheSandbox;
+using VorntoolProgress = InTheSandbox;
+using VorntoolTerminal = InTheSandbox;
+
 /// One step of a terminal session: keys to send, or a regex that the screen
 /// must show next (within the driver's deadline).
 struct Step {
@@ -55,7 +59,7 @@ std::string onTerminal(const std::vector<Step>& steps, const std::string& env = 
          quoted(json(steps)) + " -- " + command;
 }
 
-TEST(VorntoolTerminal, TabCompletesFromTheCommandTree) {
+TEST_F(VorntoolTerminal, TabCompletesFromTheCommandTree) {
   auto r = runInSandbox({}, onTerminal({
       expect(kPrompt),
       send("log\t"), expect("dump "),
@@ -70,7 +74,7 @@ TEST(VorntoolTerminal, TabCompletesFromTheCommandTree) {
   EXPECT_EQ(r.out, "status 0\n") << r.err;
 }
 
-TEST(VorntoolTerminal, UpArrowRecallsLinesAlsoAfterARestart) {
+TEST_F(VorntoolTerminal, UpArrowRecallsLinesAlsoAfterARestart) {
   const std::string rootHelpThenPrompt = "vorntool\x1b\\[39m'.*" + kHelpThenPrompt;
   const std::string first = onTerminal({
       expect(kPrompt), send("help\r"), expect(rootHelpThenPrompt),
@@ -90,7 +94,7 @@ TEST(VorntoolTerminal, UpArrowRecallsLinesAlsoAfterARestart) {
   EXPECT_EQ(r.out, "first 0\n700 STATE\n600 STATE/history\nhelp\nquit\nsecond 0\n") << r.err;
 }
 
-TEST(VorntoolTerminal, AnEmptyHistfileKeepsNoHistoryAndAPathIsUsedAsGiven) {
+TEST_F(VorntoolTerminal, AnEmptyHistfileKeepsNoHistoryAndAPathIsUsedAsGiven) {
   // Ctrl-D at an empty prompt is the end of input: status 1, as from a pipe.
   const std::vector<Step> steps{expect(kPrompt), send("help\r"), expect(kHelpThenPrompt), send("\x04")};
   auto r = runInSandbox({}, onTerminal(steps, "VORNTOOL_HISTFILE=") + " >/dev/null; echo \"off $?\"\n"
@@ -101,7 +105,7 @@ TEST(VorntoolTerminal, AnEmptyHistfileKeepsNoHistoryAndAPathIsUsedAsGiven) {
   EXPECT_EQ(r.out, "off 1\nno state\ncustom 1\n_HiStOrY_V2_\nhelp\n1\n") << r.err;
 }
 
-TEST(VorntoolTerminal, WithOutputPipedThePromptStaysOnTheTerminal) {
+TEST_F(VorntoolTerminal, WithOutputPipedThePromptStaysOnTheTerminal) {
   auto r = runInSandbox({}, onTerminal({expect(kPrompt), send("help\r"), expect(kPrompt), send("quit\r")},
                                        "", "--stdout \"$VORN_ROOT/../out\"") +
                                 " >\"$VORN_ROOT/../screen\"; echo \"status $?\"\n"
@@ -115,7 +119,7 @@ TEST(VorntoolTerminal, WithOutputPipedThePromptStaysOnTheTerminal) {
       << r.err;
 }
 
-TEST(VorntoolColour, NoColorAndDumbTerminalsGetTheSameTextWithoutEscapes) {
+TEST_F(VorntoolColour, NoColorAndDumbTerminalsGetTheSameTextWithoutEscapes) {
   auto r = runInSandbox({}, R"sh(
     plain() { sed 's/\x1b\[3[129]m//g'; }
     coloured=$(env -u NO_COLOR TERM=xterm vorntool help | od -c)
@@ -141,7 +145,7 @@ const std::string kBasebandResult =
     "Baseband log collection: Success (Vorn running)\n"
     "Path = /var/wireless/Library/Logs/CrashReporter/Baseband/log-bb-TS.tar.gz\n";
 
-TEST(VorntoolProgress, ASlowAnswerShowsTheWaitAndTheScreenEndsWithTheResultOnly) {
+TEST_F(VorntoolProgress, ASlowAnswerShowsTheWaitAndTheScreenEndsWithTheResultOnly) {
   auto r = runInSandbox(kSlowServer, onTerminal({expect(kWaiting), expect(clearedBefore("Baseband log collection"))}, "",
                                                 kScreenOption, "vorntool logdump bb x") +
                                          " >\"$VORN_ROOT/../raw\"; echo \"status $?\"\n" + kShowScreen +
@@ -150,7 +154,7 @@ TEST(VorntoolProgress, ASlowAnswerShowsTheWaitAndTheScreenEndsWithTheResultOnly)
   EXPECT_EQ(r.out, "status 0\n" + kBasebandResult + "redrawn\n") << r.err;
 }
 
-TEST(VorntoolProgress, TheTelephonyWaitIsGoneBeforeItsCompletionPrints) {
+TEST_F(VorntoolProgress, TheTelephonyWaitIsGoneBeforeItsCompletionPrints) {
   // The server's state arrives as late as every answer: "bb", which runs
   // without it, gives it time to come before "tel" needs it.
   auto r = runInSandbox(kSlowServer, onTerminal({
@@ -166,7 +170,7 @@ TEST(VorntoolProgress, TheTelephonyWaitIsGoneBeforeItsCompletionPrints) {
       << r.err;
 }
 
-TEST(VorntoolProgress, NothingIsDrawnIntoAFileOnADumbTerminalOrOverAPlainPrompt) {
+TEST_F(VorntoolProgress, NothingIsDrawnIntoAFileOnADumbTerminalOrOverAPlainPrompt) {
   // What the terminal got, control characters made visible.
   const std::string shown = " | cat -v | sed 's/log-bb-[-0-9]*/log-bb-TS/'\n";
   auto r = runInSandbox(kSlowServer,

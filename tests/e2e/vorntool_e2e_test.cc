@@ -1,12 +1,19 @@
 // SPDX-License-Identifier: MIT
 #include <gtest/gtest.h>
-#include <unistd.h>
 
 #include <regex>
 
 #include "sandbox_run.h"
 
 namespace {
+
+using VorntoolAccess = InTheSandbox;
+using VorntoolCollections = InTheSandbox;
+using VorntoolFailures = InTheSandbox;
+using VorntoolOslog = InTheSandbox;
+using VorntoolServerDown = InTheSandbox;
+using VorntoolServerTrust = InTheSandbox;
+using VorntoolStartup = InTheSandbox;
 
 const std::string kSnapshot = "/var/wireless/Library/Logs/CrashReporter/Baseband/";
 const std::string kScratch = "/var/wireless/Library/Logs/ZelmarBasebandManager/DIAG.scratch";
@@ -17,7 +24,7 @@ bool matches(const std::string& text, const std::string& pattern) {
   return std::regex_match(text, std::regex(pattern));
 }
 
-TEST(VorntoolCollections, PrintPathsThatExistUnderTheRoot) {
+TEST_F(VorntoolCollections, PrintPathsThatExistUnderTheRoot) {
   // Every printed path is listed by `ls` under the root, archives by `tar -t`.
   auto r = runInSandbox({}, R"sh(
     set -u
@@ -47,7 +54,7 @@ TEST(VorntoolCollections, PrintPathsThatExistUnderTheRoot) {
       << r.out;
 }
 
-TEST(VorntoolServerDown, RefusesServerCommandsButLocatesBasebandLogs) {
+TEST_F(VorntoolServerDown, RefusesServerCommandsButLocatesBasebandLogs) {
   auto r = runInSandbox({"--no-vornd"}, "vorntool logdump tel crash");
   EXPECT_EQ(r.status, 1);
   EXPECT_EQ(r.out, "");
@@ -70,7 +77,7 @@ TEST(VorntoolServerDown, RefusesServerCommandsButLocatesBasebandLogs) {
   EXPECT_EQ(r.out, "Baseband log collection: Success (Vorn not running)\nPath = " + kScratch + "\n");
 }
 
-TEST(VorntoolServerDown, AServerThatStartsLaterIsSeenAtTheNextPrompt) {
+TEST_F(VorntoolServerDown, AServerThatStartsLaterIsSeenAtTheNextPrompt) {
   auto r = runInSandbox({"--vornd-arg", "--start-delay-ms", "--vornd-arg", "1500"}, R"sh(
     started() { busctl --system call org.vorn.Manager /org/vorn/Manager org.vorn.Manager1 Hello s t 2>/dev/null | grep -q Started; }
     {
@@ -125,8 +132,7 @@ SandboxResult interactiveSession(const std::vector<std::string>& sandboxOptions,
   return {r.status, r.out.substr(0, errAt), r.out.substr(errAt + separator.size(), problemsAt - errAt - separator.size())};
 }
 
-TEST(VorntoolServerTrust, IgnoresServerEventsFromOtherSenders) {
-  if (geteuid() != 0) GTEST_SKIP() << "the spoofer runs as another user, which needs root";
+TEST_F(VorntoolServerTrust, IgnoresServerEventsFromOtherSenders) {
   auto r = interactiveSession({}, R"sh(
     await 1; say "logdump tel"; await 2
     name=$(busctl --system list --unique --no-legend | awk -v pid="$tool" '$2 == pid { print $1 }')
@@ -146,7 +152,7 @@ TEST(VorntoolServerTrust, IgnoresServerEventsFromOtherSenders) {
   EXPECT_EQ(r.status, 1);  // the end of input ends an interactive session with failure
 }
 
-TEST(VorntoolServerTrust, ASilentlyKilledServerIsSeenAsDown) {
+TEST_F(VorntoolServerTrust, ASilentlyKilledServerIsSeenAsDown) {
   auto r = interactiveSession({"--device", "build=customer"}, R"sh(
     await 1; say "logdump tel"; await 2
     kill -KILL "$VORN_SANDBOX_VORND_PID"
@@ -164,8 +170,7 @@ TEST(VorntoolServerTrust, ASilentlyKilledServerIsSeenAsDown) {
   EXPECT_EQ(r.status, 1);
 }
 
-TEST(VorntoolAccess, ARefusalSaysWhenTheBusDeniedAccess) {
-  if (geteuid() != 0) GTEST_SKIP() << "runs the tool as another user, which needs root";
+TEST_F(VorntoolAccess, ARefusalSaysWhenTheBusDeniedAccess) {
   const std::string denied = "vorntool: the server refused access; run as root or as a member of group \"vorn\"\n";
   struct Case {
     std::vector<std::string> options;
@@ -191,7 +196,7 @@ TEST(VorntoolAccess, ARefusalSaysWhenTheBusDeniedAccess) {
   }
 }
 
-TEST(VorntoolStartup, ChecksEndWithStatus255) {
+TEST_F(VorntoolStartup, ChecksEndWithStatus255) {
   struct Case {
     std::vector<std::string> options;
     std::string out;
@@ -210,7 +215,7 @@ TEST(VorntoolStartup, ChecksEndWithStatus255) {
   }
 }
 
-TEST(VorntoolFailures, EveryRequestEndsWithALineAndTheRightStatus) {
+TEST_F(VorntoolFailures, EveryRequestEndsWithALineAndTheRightStatus) {
   struct Case {
     std::vector<std::string> vorndArgs;
     std::string command;
@@ -236,7 +241,7 @@ TEST(VorntoolFailures, EveryRequestEndsWithALineAndTheRightStatus) {
   }
 }
 
-TEST(VorntoolOslog, ExportsTheSelectionToAFile) {
+TEST_F(VorntoolOslog, ExportsTheSelectionToAFile) {
   auto r = runInSandbox({}, R"sh(
     f="$VORN_ROOT/../all.txt"; p="$VORN_ROOT/../telhub.txt"
     vorntool logdump oslog 3600 "$f"; echo "all $? $(wc -l <"$f")"
