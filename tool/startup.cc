@@ -12,6 +12,7 @@
 #include "terminal/open_line_reader.h"
 #include "terminal/terminal_facts.h"
 #include "terminal/terminal_progress.h"
+#include "tool/output_check.h"
 #include "tool/vorn_shell.h"
 
 bool passesStartupChecks() { return passesStartupChecks(*DeviceProfile::ofThisDevice()); }
@@ -44,5 +45,5 @@ void* RunShellThread(void* wordList) {
   const bool ok = shell->run(words);
   // The worker ends the process while the main thread waits for ever; no
   // other thread runs static destructors, so exit's race cannot happen.
-  std::exit(ok ? 0 : 1);  // NOLINT(concurrency-mt-unsafe)
+  std::exit(checkedExitStatus(ok ? 0 : 1));  // NOLINT(concurrency-mt-unsafe)
 }
