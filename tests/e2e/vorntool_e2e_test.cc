@@ -2,6 +2,7 @@
 #include <gtest/gtest.h>
 
 #include <regex>
+#include <sstream>
 
 #include "sandbox_run.h"
 
@@ -10,6 +11,8 @@ namespace {
 using VorntoolAccess = InTheSandbox;
 using VorntoolCollections = InTheSandbox;
 using VorntoolFailures = InTheSandbox;
+using VorntoolFifos = InTheSandbox;
+using VorntoolLostOutput = InTheSandbox;
 using VorntoolOslog = InTheSandbox;
 using VorntoolServerDown = InTheSandbox;
 using VorntoolServerTrust = InTheSandbox;
@@ -251,6 +254,59 @@ TEST_F(VorntoolOslog, ExportsTheSelectionToAFile) {
   ASSERT_EQ(r.status, 0) << r.err;
   EXPECT_TRUE(matches(r.out, "all 0 [1-9][0-9]*\ntelhub 0 0 [1-9][0-9]*\nmissing 1\nos log collection: Failed\nshort 1\n"))
       << r.out;
+}
+
+/// Runs `command` (a shell command line) once, bounded, and prints "NAME STATUS [ERR]".
+std::string boundedRun(const std::string& name, const std::string& command) {
+  return "err=$(timeout 20 " + command + "); echo \"" + name + " $? [$err]\"\n";
+}
+
+TEST_F(VorntoolLostOutput, AFailedWriteIsReportedAndFailsTheRun) {
+  struct Case {
+    const char* name;
+    std::string command;  // stderr into $(...), then stdout redirected
+    std::string expected;
+  };
+  const std::string full = "write error: No space left on device";
+  const std::string closed = "write error: Bad file descriptor";
+  const std::vector<Case> cases = {
+      {"full", "vorntool logdump tel 2>&1 >/dev/full", "1 [vorntool: " + full + "]"},
+      {"closed", "vorntool logdump tel 2>&1 >&-", "1 [vorntool: " + closed + "]"},
+      {"failing-full", "vorntool bogus 2>&1 >/dev/full", "1 [vorntool: " + full + "]"},
+      {"version-full", "vorntool --version 2>&1 >/dev/full", "1 [vorntool: " + full + "]"},
+      // Nothing to lose: an export prints nothing when it succeeds.
+      {"silent-closed", "vorntool logdump oslog 60 \"$VORN_ROOT/../x.txt\" 2>&1 >&-", "0 []"},
+      // Written in full, as before.
+      {"written", "vorntool logdump bb nocompress 2>&1 >\"$VORN_ROOT/../bb.txt\" && wc -l <\"$VORN_ROOT/../bb.txt\"", "0 [2]"},
+  };
+  std::string script, expected;
+  for (const auto& c : cases) {
+    script += boundedRun(c.name, c.command);
+    expected += std::string(c.name) + " " + c.expected + "\n";
+  }
+  // A refusal at start-up keeps its status.
+  script += "echo radio=0 >\"$VORN_ROOT/etc/vorn/device.conf\"\n" +
+            boundedRun("refused-full", "vorntool logdump tel 2>&1 >/dev/full");
+  expected += "refused-full 255 [vorntool: " + full + "]\n";
+  auto r = runInSandbox({}, script);
+  EXPECT_EQ(r.out, expected) << r.err;
+}
+
+// A FIFO that nobody opens from the other end must not hold the tool up: an
+// export into one fails at once, and a device.conf that is one reads as
+// missing.
+TEST_F(VorntoolFifos, NeitherAnExportNorStartUpWaitsForAReader) {
+  auto r = runInSandbox({}, "cd \"$VORN_ROOT/..\"; mkfifo export.fifo\n" +
+                                boundedRun("export", "vorntool logdump oslog 60 export.fifo 2>&1") +
+                                "conf=\"$VORN_ROOT/etc/vorn/device.conf\"; rm \"$conf\"\n" +
+                                boundedRun("missing-conf", "vorntool quit 2>&1") + "mkfifo \"$conf\"\n" +
+                                boundedRun("fifo-conf", "vorntool quit 2>&1"));
+  std::istringstream lines(r.out);
+  std::string exportLine, missingConf, fifoConf;
+  std::getline(lines, exportLine), std::getline(lines, missingConf), std::getline(lines, fifoConf);
+  EXPECT_EQ(exportLine, "export 1 []");
+  ASSERT_TRUE(missingConf.starts_with("missing-conf ")) << r.out << r.err;
+  EXPECT_EQ(fifoConf, "fifo-conf " + missingConf.substr(13));
 }
 
 }  // namespace
