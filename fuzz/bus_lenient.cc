@@ -12,14 +12,14 @@
 
 namespace {
 
-using vorn::bus::kMaxNesting;
+using vorn::bus::kMaxContainerDepth;
 
 class ContentFromBytes {
  public:
   ContentFromBytes(FuzzedDataProvider& in, sd_bus_message* m) : in_(in), m_(m) {}
 
-  /// Appends an a{sv} whose variants lie at depth `depth` and returns what
-  /// readDictionary should make of it there: null when nested too deep.
+  /// Appends an a{sv} inside `depth` containers and returns what
+  /// readDictionary makes of it there.
   xpc::object dictionary(int depth) {
     std::vector<xpc::entry> entries;
     open('a', "{sv}");
@@ -27,23 +27,24 @@ class ContentFromBytes {
       open('e', "sv");
       std::string key = text();
       basic('s', key.c_str());
-      xpc::object value = variant(depth);
+      xpc::object value = variant(depth + 2);
       entries.emplace_back(std::move(key), std::move(value));
       close();
     }
     close();
-    return depth <= kMaxNesting ? xpc::object::dictionary(std::move(entries)) : xpc::object();
+    return xpc::object::dictionary(std::move(entries));
   }
 
  private:
-  /// Appends a variant at depth `depth` of a type in the value model, a basic
-  /// type outside it, or a container holding variants; returns what reading
-  /// it there gives. Variants nest two levels past what is read, some three
-  /// containers each, well inside sd-bus's limit of 128.
+  /// Appends a variant inside `depth` containers, of a type in the value
+  /// model, a basic type outside it, or a container holding variants; returns
+  /// what reading it there gives: null when its contents lie deeper than the
+  /// limit. Containers go a few levels past the limit, well inside sd-bus's
+  /// own of 128.
   xpc::object variant(int depth) {
     static constexpr const char* kSignatures[] = {"s", "x", "t", "b", "d",     "y",  "n",    "q", "i",
                                                   "u", "o", "g", "ai", "v", "a{sv}", "av", "a(sv)"};
-    const char* sig = kSignatures[in_.ConsumeIntegralInRange(0, depth <= kMaxNesting + 1 ? 16 : 12)];
+    const char* sig = kSignatures[in_.ConsumeIntegralInRange(0, depth <= kMaxContainerDepth + 6 ? 16 : 12)];
     open('v', sig);
     xpc::object value;
     // One value, read as each basic type reads it.
@@ -72,17 +73,17 @@ class ContentFromBytes {
             continue;
           }
           if (sig[1] == '(') open('r', "sv"), basic('s', "field");
-          items.push_back(variant(depth + 1));
+          items.push_back(variant(depth + (sig[1] == '(' ? 3 : 2)));
           if (sig[1] == '(') close();
         }
         close();
-        if (sig[1] == 'v' && depth + 1 <= kMaxNesting) value = xpc::object::array(std::move(items));
+        if (sig[1] == 'v') value = xpc::object::array(std::move(items));
         break;
       }
       default: basic(sig[0], &number);  // y, n, q, i, u: any bytes make a value
     }
     close();
-    return value;
+    return depth + 1 <= kMaxContainerDepth ? value : xpc::object();
   }
 
   /// Printable ASCII, so that sd-bus takes it as a string of any kind.

@@ -5,7 +5,7 @@
 
 namespace {
 
-using vorn::bus::kMaxNesting;
+using vorn::bus::kMaxContainerDepth;
 
 /// What sd-bus accepts as a string: UTF-8 without NUL, surrogates or
 /// noncharacters (U+FDD0..U+FDEF and the last two code points of each plane).
@@ -15,17 +15,20 @@ bool sendableText(const std::string& s) {
   });
 }
 
-/// Whether appendDictionary can send `v`, found at container depth `depth`.
-/// Null values are left out, so what they would hold never counts.
+/// Whether appendDictionary can send `v`, found inside `depth` containers:
+/// an item of an array lies in a variant in the array, an entry's value in a
+/// variant in a dict entry in the dictionary. Null values are left out, so
+/// what they would hold never counts.
 bool sendable(const xpc::object& v, int depth) {
+  if (v.isNull()) return true;
+  if (depth > kMaxContainerDepth) return false;
   if (const auto* s = v.asString()) return sendableText(*s);
   if (const auto* items = v.asArray())
-    return depth <= kMaxNesting &&
-           std::ranges::all_of(*items, [&](const auto& item) { return sendable(item, depth + 1); });
+    return std::ranges::all_of(*items, [&](const auto& item) { return sendable(item, depth + 2); });
   if (const auto* entries = v.asEntries())
-    return depth <= kMaxNesting && std::ranges::all_of(*entries, [&](const auto& e) {
-             return e.second.isNull() || (sendableText(e.first) && sendable(e.second, depth + 1));
-           });
+    return std::ranges::all_of(*entries, [&](const auto& e) {
+      return e.second.isNull() || (sendableText(e.first) && sendable(e.second, depth + 3));
+    });
   return true;
 }
 
@@ -50,7 +53,7 @@ xpc::object withoutNulls(const xpc::object& v) {
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   FuzzedDataProvider in(data, size);
-  const xpc::object sent = fuzz::objectFromBytes(in, {}, kMaxNesting + 2);
+  const xpc::object sent = fuzz::objectFromBytes(in, {}, kMaxContainerDepth / 2 + 2);
   auto m = fuzz::newOfflineMessage();
   FUZZ_CHECK(m);
   // Anything but a dictionary goes as an empty one.

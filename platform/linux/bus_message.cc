@@ -31,14 +31,15 @@ bool appendText(sd_bus_message* m, const std::string& text) {
   return sd_bus_message_append_basic(m, 's', text.c_str()) >= 0;
 }
 
+// `depth` is the number of containers around the value being appended.
 bool appendEntries(sd_bus_message* m, const xpc::object& value, int depth);
 bool appendItems(sd_bus_message* m, const xpc::object& value, int depth);
 
 /// Appends the contents of a variant whose signature is signatureOf(v).
 bool appendBare(sd_bus_message* m, const xpc::object& v, int depth) {
   switch (v.kind()) {
-    case xpc::type::dictionary: return appendEntries(m, v, depth + 1);
-    case xpc::type::array: return appendItems(m, v, depth + 1);
+    case xpc::type::dictionary: return appendEntries(m, v, depth);
+    case xpc::type::array: return appendItems(m, v, depth);
     case xpc::type::string: return appendText(m, *v.asString());
     case xpc::type::int64: {
       std::int64_t x = *v.asInt64();
@@ -64,18 +65,20 @@ bool appendBare(sd_bus_message* m, const xpc::object& v, int depth) {
 bool appendVariant(sd_bus_message* m, const xpc::object& v, int depth) {
   const char* sig = signatureOf(v);
   if (!sig) return true;
-  return sd_bus_message_open_container(m, 'v', sig) >= 0 && appendBare(m, v, depth) &&
+  // The variant's contents are the deepest value it adds; a dict entry and
+  // its key sit no deeper than the variant beside them.
+  if (depth + 1 > kMaxContainerDepth) return false;
+  return sd_bus_message_open_container(m, 'v', sig) >= 0 && appendBare(m, v, depth + 1) &&
          sd_bus_message_close_container(m) >= 0;
 }
 
 bool appendEntries(sd_bus_message* m, const xpc::object& value, int depth) {
-  if (depth > kMaxNesting) return false;
   if (sd_bus_message_open_container(m, 'a', "{sv}") < 0) return false;
   if (auto* entries = value.asEntries()) {
     for (const auto& [key, item] : *entries) {
       if (item.isNull()) continue;
       if (sd_bus_message_open_container(m, 'e', "sv") < 0 || !appendText(m, key) ||
-          !appendVariant(m, item, depth) || sd_bus_message_close_container(m) < 0)
+          !appendVariant(m, item, depth + 2) || sd_bus_message_close_container(m) < 0)
         return false;
     }
   }
@@ -83,18 +86,17 @@ bool appendEntries(sd_bus_message* m, const xpc::object& value, int depth) {
 }
 
 bool appendItems(sd_bus_message* m, const xpc::object& value, int depth) {
-  if (depth > kMaxNesting) return false;
   if (sd_bus_message_open_container(m, 'a', "v") < 0) return false;
   for (const auto& item : *value.asArray())
-    if (!appendVariant(m, item, depth)) return false;
+    if (!appendVariant(m, item, depth + 1)) return false;
   return sd_bus_message_close_container(m) >= 0;
 }
 
 bool readEntries(sd_bus_message* m, xpc::object& out, int depth);
 bool readItems(sd_bus_message* m, xpc::object& out, int depth);
 
-/// Reads one variant; a type outside the value model, or one nested too deep,
-/// is skipped and reads as null.
+/// Reads one variant found inside `depth` containers; a type outside the
+/// value model, or contents nested too deep, is skipped and reads as null.
 bool readVariant(sd_bus_message* m, xpc::object& out, int depth) {
   char type = 0;
   const char* contents = nullptr;
@@ -103,7 +105,9 @@ bool readVariant(sd_bus_message* m, xpc::object& out, int depth) {
   if (sd_bus_message_enter_container(m, 'v', contents) < 0) return false;
   bool ok = true;
   out = {};
-  if (sig == "s") {
+  if (depth + 1 > kMaxContainerDepth) {
+    ok = sd_bus_message_skip(m, contents) >= 0;
+  } else if (sig == "s") {
     const char* s = nullptr;
     ok = sd_bus_message_read_basic(m, 's', &s) >= 0;
     if (ok) out = xpc::object::string(s);
@@ -123,9 +127,9 @@ bool readVariant(sd_bus_message* m, xpc::object& out, int depth) {
     double d = 0;
     ok = sd_bus_message_read_basic(m, 'd', &d) >= 0;
     if (ok) out = xpc::object::dbl(d);
-  } else if (sig == "a{sv}" && depth < kMaxNesting) {
+  } else if (sig == "a{sv}") {
     ok = readEntries(m, out, depth + 1);
-  } else if (sig == "av" && depth < kMaxNesting) {
+  } else if (sig == "av") {
     ok = readItems(m, out, depth + 1);
   } else {
     ok = sd_bus_message_skip(m, contents) >= 0;
@@ -142,7 +146,7 @@ bool readEntries(sd_bus_message* m, xpc::object& out, int depth) {
     if (r == 0) break;
     const char* key = nullptr;
     xpc::object value;
-    if (sd_bus_message_read_basic(m, 's', &key) < 0 || !readVariant(m, value, depth) ||
+    if (sd_bus_message_read_basic(m, 's', &key) < 0 || !readVariant(m, value, depth + 2) ||
         sd_bus_message_exit_container(m) < 0)
       return false;
     entries.emplace_back(key, std::move(value));
@@ -160,7 +164,7 @@ bool readItems(sd_bus_message* m, xpc::object& out, int depth) {
     if (r < 0) return false;
     if (r > 0) break;
     xpc::object item;
-    if (!readVariant(m, item, depth)) return false;
+    if (!readVariant(m, item, depth + 1)) return false;
     items.push_back(std::move(item));
   }
   if (sd_bus_message_exit_container(m) < 0) return false;

@@ -14,14 +14,16 @@
 /// a D-Bus error stands for. No connection is needed beyond the message.
 namespace vorn::bus {
 
-/// Deeper containers than this are refused when sending and read as null when
-/// received; dbus-daemon itself allows at most 64 nested containers.
-inline constexpr int kMaxNesting = 32;
+/// dbus-daemon disconnects a sender whose message holds a value inside more
+/// than this many containers: arrays, dict entries and variants, so that each
+/// level of `a{sv}` costs three and each level of `av` two. A value deeper
+/// than this is refused when sending and read as null when received.
+inline constexpr int kMaxContainerDepth = 64;
 
 /// Appends `value` as `a{sv}`; anything but a dictionary is sent as an empty
 /// one. Null entries are left out (D-Bus cannot carry them). False when the
 /// value cannot be encoded (invalid UTF-8, an embedded NUL, too deep); the
-/// message is then unusable.
+/// message is then unusable and must not be sent.
 bool appendDictionary(sd_bus_message* m, const xpc::object& value);
 
 /// Reads the `a{sv}` at the message's read position. Entries of a type the
