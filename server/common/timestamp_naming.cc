@@ -1,16 +1,22 @@
 // SPDX-License-Identifier: MIT
 #include "server/common/timestamp_naming.h"
 
+#include <algorithm>
 #include <cctype>
 #include <charconv>
+#include <cstdio>
 
 namespace vorn::server {
 
 std::string formatTimestamp(std::time_t when) {
   std::tm local{};
-  localtime_r(&when, &local);
-  char buf[32];
-  std::strftime(buf, sizeof buf, "%Y-%m-%d-%H%M%S", &local);
+  if (localtime_r(&when, &local) == nullptr) return std::string(kEarliestTimestamp);
+  // strftime's %Y does not pad a year before 1000.
+  const long long year = local.tm_year + 1900LL;
+  if (year < 0) return std::string(kEarliestTimestamp);
+  char buf[48];
+  std::snprintf(buf, sizeof buf, "%04lld-%02d-%02d-%02d%02d%02d", year, local.tm_mon + 1, local.tm_mday,
+                local.tm_hour, local.tm_min, local.tm_sec);
   return buf;
 }
 
@@ -23,15 +29,19 @@ std::string uniqueTimestamp(const std::string& base, const std::function<bool(co
 }
 
 std::optional<TimestampKey> parseTimestamp(std::string_view ts) {
-  // "YYYY-MM-DD-HHMMSS": digits everywhere except the three hyphens.
-  constexpr std::string_view kShape = "0000-00-00-000000";
-  if (ts.size() < kShape.size()) return std::nullopt;
+  // A year of four digits, or more without a leading zero, then
+  // "-MM-DD-HHMMSS": digits everywhere except the hyphens.
+  const std::size_t yearDigits = std::min(ts.find_first_not_of("0123456789"), ts.size());
+  if (yearDigits < 4 || (yearDigits > 4 && ts.front() == '0')) return std::nullopt;
+  constexpr std::string_view kShape = "-00-00-000000";
+  if (ts.size() < yearDigits + kShape.size()) return std::nullopt;
   for (size_t i = 0; i < kShape.size(); ++i) {
-    bool fits = kShape[i] == '0' ? std::isdigit(static_cast<unsigned char>(ts[i])) != 0 : ts[i] == kShape[i];
+    const char c = ts[yearDigits + i];
+    bool fits = kShape[i] == '0' ? std::isdigit(static_cast<unsigned char>(c)) != 0 : c == kShape[i];
     if (!fits) return std::nullopt;
   }
-  TimestampKey key{std::string(ts.substr(0, kShape.size())), 1};
-  std::string_view rest = ts.substr(kShape.size());
+  TimestampKey key{std::string(ts.substr(0, yearDigits + kShape.size())), 1};
+  std::string_view rest = ts.substr(yearDigits + kShape.size());
   if (rest.empty()) return key;
   if (rest.size() < 2 || rest.front() != '-' || rest[1] == '0') return std::nullopt;
   rest.remove_prefix(1);

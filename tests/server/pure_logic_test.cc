@@ -31,11 +31,44 @@ TEST(TimestampNaming, ParsesOnlyCollectionTimestampsAndOrdersTheCounterNumerical
       {"2026-01-02-030405-", std::nullopt},
       {"2026-01-02-030405-x", std::nullopt},
       {"2026-01-02-03040", std::nullopt},
+      {"0999-01-02-030405", TimestampKey{"0999-01-02-030405", 1}},
+      {"10000-01-02-030405-3", TimestampKey{"10000-01-02-030405", 3}},
+      {"999-01-02-030405", std::nullopt},
+      {"09999-01-02-030405", std::nullopt},  // a fifth digit is no padding
       {"2026/01/02-030405", std::nullopt},
       {"", std::nullopt},
   };
   for (const auto& c : cases) EXPECT_EQ(parseTimestamp(c.text), c.key) << c.text;
   EXPECT_LT(*parseTimestamp("2026-01-02-030405-9"), *parseTimestamp("2026-01-02-030405-10"));
+}
+
+TEST(TimestampNaming, NamesEveryYearTheClockCanShowSoThatTheNamesReadBackInOrder) {
+  const char* zone = std::getenv("TZ");
+  const std::string saved = zone ? zone : "";
+  setenv("TZ", "UTC0", 1);
+  tzset();
+  // In time order; the earliest name stands for every time it cannot name.
+  const std::pair<std::time_t, std::string> cases[] = {
+      {-62167219201, std::string(kEarliestTimestamp)},  // the year -1
+      {-62167219200, "0000-01-01-000000"},
+      {-30610224001, "0999-12-31-235959"},
+      {1767323045, "2026-01-02-030405"},
+      {253402300799, "9999-12-31-235959"},
+      {253402300800, "10000-01-01-000000"},
+      {INT64_MAX, std::string(kEarliestTimestamp)},  // past what localtime reaches
+  };
+  std::optional<TimestampKey> previous;
+  for (const auto& [when, name] : cases) {
+    EXPECT_EQ(formatTimestamp(when), name) << when;
+    const auto key = parseTimestamp(name);
+    ASSERT_TRUE(key.has_value()) << name;
+    if (name != kEarliestTimestamp && previous) {
+      EXPECT_LT(*previous, *key) << name;
+    }
+    previous = key;
+  }
+  zone ? setenv("TZ", saved.c_str(), 1) : unsetenv("TZ");
+  tzset();
 }
 
 TEST(TimestampNaming, TakesTheFirstFreeCounterAndKnowsWhichNamesUseATimestamp) {
