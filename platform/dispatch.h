@@ -19,6 +19,9 @@ struct GroupState;
 
 /// A serial FIFO queue with its own worker thread. Copies share the queue;
 /// the thread ends once the last handle is gone and the pending work is done.
+/// Work still queued when the last handle goes away runs all the same, in
+/// order: releasing that handle waits for it, unless the release happens in
+/// work on the queue itself, whose thread then finishes the rest alone.
 class queue {
  public:
   queue() = default;  // empty handle

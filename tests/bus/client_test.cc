@@ -66,6 +66,13 @@ class Peer {
     std::lock_guard lock(mutex_);
     return caller_;
   }
+  /// Waits, within 10 s, until `count` calls other than Hello have come.
+  bool waitForCalls(int count) const {
+    for (auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(10); received_ < count;
+         std::this_thread::sleep_for(std::chrono::milliseconds(5)))
+      if (std::chrono::steady_clock::now() > deadline) return false;
+    return true;
+  }
 
  private:
   static int onCall(sd_bus_message* m, void* self, sd_bus_error*) {
@@ -78,6 +85,7 @@ class Peer {
     else sd_bus_message_read(m, member == "Hello" ? "s" : "ss", &client, &command);
     vorn::bus::readDictionary(m, request);
     std::string call = std::string(client) + "/" + std::to_string(task) + "/" + command;
+    if (member != "Hello") ++p->received_;
     if (member == "Hello") {
       {
         std::lock_guard lock(p->mutex_);
@@ -110,6 +118,7 @@ class Peer {
   std::int32_t status_;
   sd_bus* bus_ = nullptr;
   std::atomic<bool> stop_ = false;
+  std::atomic<int> received_ = 0;
   std::vector<vorn::bus::MessagePtr> unanswered_;  // peer thread only
   mutable std::mutex mutex_;
   std::string caller_;
@@ -374,6 +383,28 @@ INSTANTIATE_TEST_SUITE_P(
     Calls, CallFailure,
     ::testing::Combine(::testing::ValuesIn(kFailures), ::testing::Values(Caller::sync, Caller::async, Caller::helper)),
     [](const auto& paramInfo) { return std::string(std::get<0>(paramInfo.param).name) + kCallers[int(std::get<1>(paramInfo.param))]; });
+
+TEST_F(ClientOverBus, ACallPendingWhenTheManagerOrTheBusGoesCompletesOnceUnanswered) {
+  // Longer than any wait here: no answer can come from the call's timeout.
+  setenv("VORN_CALL_TIMEOUT_MS", "600000", 1);
+  for (const std::string ending : {"manager released", "bus killed"}) {
+    Peer server(false, Act::noReply);
+    std::vector<std::int32_t> statuses;  // on the queue only
+    dispatch::group done;
+    done.enter();
+    auto m = manager();
+    vorn::client::PerformCommand(m, "TraceDumpState", [&](TelephonyXPC::Result r, object) {
+      statuses.push_back(r.status);
+      if (statuses.size() == 1) done.leave();
+    }, dict({}));
+    ASSERT_TRUE(server.waitForCalls(1)) << ending;
+    ending == "manager released" ? m.reset() : bus_.reset();
+    ASSERT_TRUE(done.wait(kPatience)) << ending;
+    m.reset();
+    ASSERT_TRUE(drain(queue_));
+    EXPECT_EQ(statuses, std::vector<std::int32_t>{kNoReply}) << ending;
+  }
+}
 
 TEST_F(ClientOverBus, RefusesCallersThatThePolicyDeniesAndSaysSo) {
   Peer server(false, Act::answer), helper(true, Act::answer);

@@ -3,6 +3,7 @@
 
 #include <atomic>
 #include <chrono>
+#include <future>
 #include <mutex>
 #include <thread>
 #include <vector>
@@ -47,6 +48,38 @@ TEST(DispatchQueue, LastHandleMayBeDroppedOnItsOwnThread) {
     });
   }
   EXPECT_TRUE(done.wait(10s));
+}
+
+TEST(DispatchQueue, WorkQueuedWhenTheLastHandleGoesStillRunsInOrder) {
+  std::vector<int> ran;  // the queues' threads write it; read once they are done
+  {
+    // Released from another thread: the release returns once the work ran.
+    std::promise<void> gate;
+    dispatch::queue q("released.elsewhere");
+    q.async([opened = gate.get_future().share()] { opened.wait(); });
+    for (int i = 0; i < 3; ++i) q.async([&ran, i] { ran.push_back(i); });
+    std::thread opener([&gate] { gate.set_value(); });
+    q = dispatch::queue();
+    opener.join();
+    EXPECT_EQ(ran, (std::vector<int>{0, 1, 2}));
+  }
+  // Released by its own work: what was queued behind it runs all the same.
+  dispatch::group done;
+  done.enter();
+  {
+    std::promise<void> gate;
+    dispatch::queue q("released.on.itself");
+    q.async([q, opened = gate.get_future().share()]() mutable {
+      opened.wait();
+      q = dispatch::queue();
+    });
+    for (int i = 3; i < 6; ++i) q.async([&ran, i] { ran.push_back(i); });
+    q.async([done] { done.leave(); });
+    q = dispatch::queue();
+    gate.set_value();
+  }
+  ASSERT_TRUE(done.wait(10s));
+  EXPECT_EQ(ran, (std::vector<int>{0, 1, 2, 3, 4, 5}));
 }
 
 TEST(DispatchGroup, WaitEndsWhenEmptyOrAtTheDeadline) {
