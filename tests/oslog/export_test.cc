@@ -8,6 +8,7 @@
 #include "oslog/os_log_stream.h"
 #include "platform/logstore/system_log.h"
 #include "tests/oslog/oslog_test_support.h"
+#include "tests/support/file_size_limit.h"
 
 namespace {
 
@@ -92,10 +93,25 @@ TEST_F(AnExportOverAFakeStore, PathInAMissingFolderFailsAndLogsThePath) {
 }
 
 TEST_F(AnExportOverAFakeStore, AFailedWriteFailsTheExport) {
-  out_ = "/dev/full";
-  EXPECT_FALSE(run({{messageEvent(secondsAgo(5), "Telhub", "lost on a full disk")}}));
-  EXPECT_THAT(logged(), ElementsAre("Getting oslog stream: history = 600.000000",
-                                    "Failed to write file: /dev/full (No space left on device)"));
+  // Less than two blocks of lines: one is written while they come, the
+  // rest at the end, where a limit just below the total cuts it short.
+  const std::vector<logstore::Event> lines(1000, messageEvent(secondsAgo(5), "Telhub", std::string(60, 'm')));
+  const std::size_t total = lines.size() * lineFor(lines[0]).size();
+  const std::size_t limit = total - 100;
+  struct Case {
+    std::string path;
+    std::string error;
+  } const cases[] = {{"/dev/full", "No space left on device"}, {out_, "File too large"}};
+  std::vector<std::string> expected;
+  for (const auto& c : cases) {
+    vorn::test::FileSizeLimit disk(limit);
+    out_ = c.path;
+    EXPECT_FALSE(run({lines})) << c.path;
+    expected.insert(expected.end(), {"Getting oslog stream: history = 600.000000",
+                                     "Failed to write file: " + c.path + " (" + c.error + ")"});
+  }
+  EXPECT_EQ(logged(), expected);
+  EXPECT_EQ(std::filesystem::file_size(out_), limit);
 }
 
 /// What an observer was told, in order.

@@ -127,4 +127,37 @@ TEST_F(AnExportFromTheJournal, PrintsTheLocalWallClock) {
   EXPECT_EQ(firstDate("<+02>-2") - firstDate("UTC"), 7200);
 }
 
+TEST_F(AnExportFromTheJournal, ShowsEachLineAtItsOwnOffsetAcrossAChangeOfTheClock) {
+  // A zone one hour east that puts its clock on at half past an hour in the
+  // middle of the fixture's day (rules count the days of the year from 0).
+  const std::time_t change = (std::time(nullptr) - 12 * 3600) / 3600 * 3600 + 1800;
+  const std::time_t standardClock = change + 3600;
+  std::tm at{};
+  gmtime_r(&standardClock, &at);
+  char zone[64];
+  std::snprintf(zone, sizeof zone, "XST-1XDT,%d/%02d:%02d,%d/12:00", at.tm_yday, at.tm_hour, at.tm_min,
+                (at.tm_yday + 180) % 365);
+  auto datesIn = [&](const std::string& tz) {
+    oslog_test::ScopedEnv env("TZ", tz);
+    std::vector<std::time_t> dates;
+    for (const auto& line : exportLines({}, {}, 48 * 3600.0)) {
+      std::tm tm{};
+      strptime(line.c_str(), "%Y-%m-%d %H:%M:%S", &tm);
+      dates.push_back(timegm(&tm));
+    }
+    return dates;
+  };
+  const auto utc = datesIn("UTC0"), local = datesIn(zone);
+  ASSERT_EQ(utc.size(), local.size());
+  long before = 0, after = 0, wrong = 0;
+  for (std::size_t i = 0; i < utc.size(); ++i) {
+    const bool summer = utc[i] >= change;
+    (summer ? after : before)++;
+    wrong += local[i] - utc[i] != (summer ? 7200 : 3600);
+  }
+  EXPECT_EQ(wrong, 0) << zone;
+  EXPECT_GT(before, 0);
+  EXPECT_GT(after, 0);
+}
+
 }  // namespace

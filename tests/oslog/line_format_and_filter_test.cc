@@ -71,6 +71,28 @@ TEST(LocalSecondsFromGMT, FollowsTheZoneAtTheEventsDate) {
   oslog_test::ScopedEnv zone("TZ", "CET-1CEST,M3.5.0,M10.5.0/3");
   EXPECT_EQ(logstore::localSecondsFromGMT(1768478400), 3600);  // 2026-01-15
   EXPECT_EQ(logstore::localSecondsFromGMT(1784116800), 7200);  // 2026-07-15
+  EXPECT_EQ(logstore::localSecondsFromGMT(1761440399), 7200);  // 2025-10-26 00:59:59, the last second of CEST
+  EXPECT_EQ(logstore::localSecondsFromGMT(1761440400), 3600);
+}
+
+// One formatter keeps the date text of the last second it printed: the
+// text follows the local clock, not the instant, across changes of offset.
+TEST(LineFormatter, FollowsTheLocalClockAcrossOffsetChanges) {
+  constexpr std::int64_t kFallBack = 1761438600;  // 2025-10-26 00:30:00 UTC, 02:30 in Berlin, either side
+  constexpr std::int64_t kSpringForward = 1743296399;  // 2025-03-30 00:59:59 UTC, a second before 03:00 CEST
+  const std::pair<Event, const char*> lines[] = {
+      {at(kFallBack * 1000000, 7200), "2025-10-26 02:30:00"},
+      {at(kFallBack * 1000000 + 500000, 3600), "2025-10-26 01:30:00"},  // the same instant's second
+      {at((kFallBack + 3600) * 1000000, 3600), "2025-10-26 02:30:00"},  // an hour on, the same wall clock
+      {at(kSpringForward * 1000000, 3600), "2025-03-30 01:59:59"},
+      {at((kSpringForward + 1) * 1000000, 7200), "2025-03-30 03:00:00"},
+  };
+  oslog::LineFormatter formatter;
+  for (const auto& [event, date] : lines) {
+    std::string out;
+    formatter.append(event, out);
+    EXPECT_EQ(out, std::string(date) + " +0000 " + kTail);
+  }
 }
 
 // Image fragments ignore case and diacritics across Unicode, not ASCII only

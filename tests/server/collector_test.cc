@@ -13,8 +13,10 @@
 
 #include "server/common/collector.h"
 #include "server/common/snapshot_scan.h"
+#include "server/common/timestamp_naming.h"
 #include "server/common/tree_removal.h"
 #include "tests/server/collection_reader.h"
+#include "tests/support/file_size_limit.h"
 
 namespace fs = std::filesystem;
 using vorn::server::CollectAction;
@@ -91,6 +93,12 @@ class CollectorTest : public ::testing::Test {
   }
 
   std::string path(const std::string& rel) const { return prefix_ + "/" + rel; }
+
+  std::set<std::string> snapshotNames() const {
+    std::set<std::string> names;
+    for (const auto& e : fs::directory_iterator(snapshots())) names.insert(e.path().filename().string());
+    return names;
+  }
 
   std::string root_;
   std::string prefix_;
@@ -266,6 +274,44 @@ TEST_P(CollectionForms, SparseFilesAreStoredByWhatTheyHold) {
   }
 }
 
+TEST_P(CollectionForms, AWriteThatFailsPartWayLeavesNothingBehind) {
+  // Random bytes do not compress, so every form outgrows a limit of 1 MiB;
+  // tar.gz, with two cores or more, when it writes its last blocks as it
+  // finishes.
+  std::mt19937 random(3);
+  std::string data(3 << 20, '\0');
+  for (auto& c : data) c = static_cast<char>(random());
+  write(logs() / "big.log", data);
+  fs::create_directories(snapshots());
+  CollectOutcome outcome;
+  {
+    vorn::test::FileSizeLimit disk(1 << 20);
+    outcome = collect(GetParam().compression);
+  }
+  EXPECT_FALSE(outcome.ok);
+  EXPECT_NE(outcome.error.find("File too large"), std::string::npos) << outcome.error;
+  EXPECT_EQ(snapshotNames(), std::set<std::string>{});
+}
+
+TEST_P(CollectionForms, ANameTakenBeforeTheRenameFailsTheCollectionAndIsLeftAlone) {
+  write(logs() / "a.log", "a");
+  std::string squatter;
+  Collector::Options options;
+  // While the output is written, somebody makes a folder of its final name.
+  options.beforeOpen = [&](int, const std::string&) {
+    for (const auto& name : snapshotNames()) {
+      if (!name.ends_with(".partial") || name.find(".manifest.") != std::string::npos) continue;
+      squatter = name.substr(1, name.size() - 1 - std::string(".partial").size());
+      fs::create_directories(snapshots() / squatter / "theirs");
+    }
+  };
+  auto outcome = collect(GetParam().compression, options);
+  EXPECT_FALSE(outcome.ok);
+  EXPECT_NE(outcome.error.find("cannot rename"), std::string::npos) << outcome.error;
+  EXPECT_EQ(snapshotNames(), std::set<std::string>{squatter});
+  EXPECT_TRUE(fs::is_directory(snapshots() / squatter / "theirs"));
+}
+
 INSTANTIATE_TEST_SUITE_P(Collector, CollectionForms,
                          ::testing::Values(Form{"TarGz", Compression::tarGz}, Form{"Tar", Compression::tar},
                                            Form{"Folder", Compression::none}),
@@ -293,6 +339,22 @@ TEST_F(CollectorTest, TheSizeLimitCutsWhatIsBeyondItAndTheManifestSaysSo) {
   EXPECT_NE(manifest.find("[cut: 0 of 6000 bytes stored"), std::string::npos) << manifest;
 }
 
+TEST_F(CollectorTest, CollectionsInTheSameSecondAreNumberedAndNoneReplacesAnother) {
+  write(logs() / "a.log", "a");
+  const std::string ts = vorn::server::formatTimestamp(1700000000);  // the fixture's clock
+  std::vector<std::string> timestamps;
+  std::set<std::string> outputs;
+  for (auto compression : {Compression::tarGz, Compression::tarGz, Compression::tar, Compression::none}) {
+    auto outcome = collect(compression);
+    ASSERT_TRUE(outcome.ok) << outcome.error;
+    timestamps.push_back(outcome.timestamp);
+    outputs.insert(output_.filename().string());
+  }
+  EXPECT_EQ(timestamps, (std::vector<std::string>{ts, ts + "-2", ts + "-3", ts + "-4"}));
+  EXPECT_EQ(outputs.size(), 4u);
+  EXPECT_EQ(snapshotNames(), outputs);
+}
+
 TEST_F(CollectorTest, LeftoversOfAKilledRunGoWithoutFollowingTheirLinks) {
   write(root_ + "/keep/keep.txt", "keep");
   auto leave = [&] {
@@ -304,11 +366,7 @@ TEST_F(CollectorTest, LeftoversOfAKilledRunGoWithoutFollowingTheirLinks) {
   write(snapshots() / "log-bb-2020-01-01-000000.tar.gz", "a finished one");
   write(snapshots() / ".hidden", "not ours");
   const std::set<std::string> kept = {"log-bb-2020-01-01-000000.tar.gz", ".hidden"};
-  auto names = [&] {
-    std::set<std::string> out;
-    for (const auto& e : fs::directory_iterator(snapshots())) out.insert(e.path().filename().string());
-    return out;
-  };
+  auto names = [&] { return snapshotNames(); };
 
   leave();
   Collector(root_).removeLeftovers();  // what vornd does as it starts

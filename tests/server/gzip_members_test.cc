@@ -1,10 +1,13 @@
 // SPDX-License-Identifier: MIT
 #include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
 #include <zlib.h>
 
 #include <random>
 
 #include "server/common/gzip_members.h"
+#include "tests/support/file_size_limit.h"
 
 using vorn::server::ByteSink;
 using vorn::server::GzipMembersWriter;
@@ -95,6 +98,26 @@ INSTANTIATE_TEST_SUITE_P(Server, GzipMembers,
                                            Stream{"ManyBlocksFewThreads", 100 * 4096 + 5, 4096, 1, 10000, 101},
                                            Stream{"ManyBlocksManyThreads", 100 * 4096 + 5, 4096, 4, 333, 101}),
                          [](const auto& paramInfo) { return std::string(paramInfo.param.label); });
+
+TEST(FdByteSink, AShortWriteIsFinishedOrFails) {
+  char path[] = "/tmp/vorn-byte-sink.XXXXXX";
+  const int fd = ::mkstemp(path);
+  ASSERT_GE(fd, 0);
+  const std::string data(10000, 'x');
+  {
+    // The first write takes what fits, the second one fails.
+    vorn::test::FileSizeLimit disk(4096);
+    vorn::server::FdByteSink sink(fd);
+    EXPECT_FALSE(sink.write(data.data(), data.size()));
+    EXPECT_EQ(sink.error(), "File too large");
+    EXPECT_FALSE(sink.finish());
+  }
+  struct stat st {};
+  EXPECT_EQ(::fstat(fd, &st), 0);
+  EXPECT_EQ(st.st_size, 4096);
+  ::close(fd);
+  ::unlink(path);
+}
 
 TEST(GzipMembersFailure, AFullDiskFailsTheStream) {
   StringSink sink(10000);
