@@ -11,6 +11,7 @@
 #include <optional>
 #include <vector>
 
+#include "platform/protocol/protocol.h"
 #include "platform/vorn_client.h"
 #include "tests/support/private_bus.h"
 
@@ -63,7 +64,7 @@ int main(int argc, char** argv) {
   std::filesystem::create_directories(root + "/etc/vorn");
   std::ofstream(root + "/etc/vorn/device.conf") << "radio=1\n";
   vorn::test::ChildProcess daemon({{vornd, "--root", root}, {}, -1, "/dev/null"});
-  if (!vorn::test::waitForBusName("org.vorn.Manager", std::chrono::seconds(10))) {
+  if (!vorn::test::waitForBusName(vorn::protocol::kManagerBusName, std::chrono::seconds(10))) {
     std::fprintf(stderr, "vornd did not take its name\n");
     return 1;
   }
