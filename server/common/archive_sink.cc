@@ -245,10 +245,7 @@ bool ArchiveSink::commit(const std::string& finalName, std::string* error) {
     *error = errnoText("cannot flush " + partialName_, errno);
     return false;
   }
-  if (::renameat(dirFd_, partialName_.c_str(), dirFd_, finalName.c_str()) != 0) {
-    *error = errnoText("cannot rename " + partialName_, errno);
-    return false;
-  }
+  if (!publishAt(dirFd_, partialName_, finalName, error)) return false;
   done_ = true;
   return true;
 }

@@ -124,10 +124,7 @@ bool FolderSink::addManifest(int fd, off_t size, std::string* error) {
 
 bool FolderSink::commit(const std::string& finalName, std::string* error) {
   if (!leaveFolder(error)) return false;
-  if (::renameat(dirFd_, partialName_.c_str(), dirFd_, finalName.c_str()) != 0) {
-    *error = errnoText("cannot rename " + partialName_, errno);
-    return false;
-  }
+  if (!publishAt(dirFd_, partialName_, finalName, error)) return false;
   done_ = true;
   return true;
 }

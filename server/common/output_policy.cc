@@ -2,7 +2,9 @@
 #include "server/common/output_policy.h"
 #include "platform/linux/errno_text.h"
 
+#include <fcntl.h>
 #include <grp.h>
+#include <stdio.h>
 #include <unistd.h>
 
 #include <cerrno>
@@ -32,6 +34,17 @@ bool applyOutputPolicy(int fd, mode_t mode, std::optional<gid_t> group, const st
     return false;
   }
   return true;
+}
+
+bool publishAt(int dirFd, const std::string& partialName, const std::string& finalName, std::string* error) {
+  int failed = ::renameat2(dirFd, partialName.c_str(), dirFd, finalName.c_str(), RENAME_NOREPLACE);
+  // A file system without the flag: the name was free when it was chosen,
+  // and only this daemon writes in its folder.
+  if (failed != 0 && errno == EINVAL)
+    failed = ::renameat(dirFd, partialName.c_str(), dirFd, finalName.c_str());
+  if (failed == 0) return true;
+  *error = errnoText("cannot rename " + partialName, errno);
+  return false;
 }
 
 }  // namespace vorn::server

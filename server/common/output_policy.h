@@ -28,4 +28,9 @@ std::optional<gid_t> outputGroup();
 bool applyOutputPolicy(int fd, mode_t mode, std::optional<gid_t> group, const std::string& what,
                        std::string* error);
 
+/// Gives the finished output `partialName` in the folder `dirFd` its name
+/// `finalName`, never in place of something already there: a collection
+/// that lost the race for its name fails rather than replace another one.
+bool publishAt(int dirFd, const std::string& partialName, const std::string& finalName, std::string* error);
+
 }  // namespace vorn::server
