@@ -7,9 +7,10 @@
 #include <atomic>
 #include <cerrno>
 #include <cstdio>
-#include <cstring>
 #include <iostream>
 #include <streambuf>
+
+#include "platform/linux/errno_text.h"
 
 namespace {
 
@@ -74,6 +75,6 @@ int checkedExitStatus(int status) {
   }
   const int error = firstWriteError.load();
   if (error == 0) return status;
-  std::cerr << "vorntool: write error: " << std::strerror(error) << std::endl;
+  std::cerr << "vorntool: write error: " << vorn::errnoText(error) << std::endl;
   return status == 0 ? 1 : status;
 }
