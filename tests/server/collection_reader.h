@@ -6,8 +6,8 @@
 #include <map>
 #include <string>
 
-/// Reads a collection back, whatever its form, for tests: an archive through
-/// libarchive, a folder through the file system (never following links).
+/// Reads a collection back, whatever its form, for tests: an archive or a
+/// folder, both through libarchive (never following links).
 namespace vorn::test {
 
 struct CollectedItem {
@@ -16,7 +16,7 @@ struct CollectedItem {
   off_t size = 0;
   /// The non-hole data: offset -> bytes. A plain file has one block at 0.
   std::map<off_t, std::string> blocks;
-  /// Bytes the item takes on disk (folders) or in the archive body.
+  /// Data bytes, holes left out.
   off_t stored = 0;
 
   /// The content with holes as zeros; only for small files.
