@@ -347,15 +347,14 @@ TEST_F(CollectorTest, LeftoversOfAKilledRunGoWithoutFollowingTheirLinks) {
   write(snapshots() / "log-bb-2020-01-01-000000.tar.gz", "a finished one");
   write(snapshots() / ".hidden", "not ours");
   const std::set<std::string> kept = {"log-bb-2020-01-01-000000.tar.gz", ".hidden"};
-  auto names = [&] { return snapshotNames(); };
 
   leave();
   Collector(root_).removeLeftovers();  // what vornd does as it starts
-  EXPECT_EQ(names(), kept);
+  EXPECT_EQ(snapshotNames(), kept);
   leave();
   auto outcome = collect(Compression::tarGz);
   ASSERT_TRUE(outcome.ok) << outcome.error;
-  auto after = names();
+  auto after = snapshotNames();
   after.erase(output_.filename().string());
   EXPECT_EQ(after, kept);
   EXPECT_EQ(slurp(root_ + "/keep/keep.txt"), "keep");
