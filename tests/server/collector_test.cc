@@ -22,7 +22,6 @@ namespace fs = std::filesystem;
 using vorn::server::CollectAction;
 using vorn::server::Collector;
 using vorn::server::CollectOutcome;
-using vorn::server::CollectRequest;
 using vorn::server::Compression;
 using vorn::test::CollectedItem;
 
@@ -71,16 +70,12 @@ class CollectorTest : public ::testing::Test {
 
   CollectOutcome collect(Compression compression, Collector::Options options = {}) {
     options.clock = [] { return std::time_t{1700000000}; };
-    Collector collector(root_, std::move(options));
-    CollectRequest request;
-    request.compression = compression;
     std::atomic<bool> cancel{false};
-    CollectOutcome outcome = collector.collect(request, cancel);
+    Collector collector(root_, std::move(options));
+    CollectOutcome outcome = collector.collect({CollectAction::telephonyLogs, compression, {}}, cancel);
     prefix_ = "log-bb-" + outcome.timestamp + "-tel";
-    output_ = snapshots() / ("log-bb-" + outcome.timestamp +
-                             (compression == Compression::none ? "-tel"
-                              : compression == Compression::tar ? ".tar"
-                                                                : ".tar.gz"));
+    const char* extension = compression == Compression::tar ? ".tar" : ".tar.gz";
+    output_ = snapshots() / (compression == Compression::none ? prefix_ : "log-bb-" + outcome.timestamp + extension);
     return outcome;
   }
 

@@ -87,7 +87,7 @@ struct RequestCase {
   const char* label;
   std::vector<xpc::entry> entries;
   std::optional<Compression> compression;  // empty: a bad request
-  std::string reason;
+  std::string reason = {};
 };
 
 void PrintTo(const RequestCase& c, std::ostream* os) { *os << c.label; }
@@ -104,22 +104,18 @@ TEST_P(CollectRequests, AreReadOrRefused) {
 
 xpc::entry action(const char* name) { return {"TraceAction", object::string(name)}; }
 xpc::entry reason(std::string text) { return {"TraceDumpStateReason", object::string(std::move(text))}; }
+xpc::entry compression(object value) { return {"TraceDumpStatePerformCompression", std::move(value)}; }
 
 INSTANTIATE_TEST_SUITE_P(
     Server, CollectRequests,
     ::testing::Values(
         RequestCase{"Defaults", {action("CollectTelephonyLogs")}, Compression::tarGz, "Unknown"},
-        RequestCase{"Tar", {action("CollectBasebandLogs"), {"TraceDumpStatePerformCompression", object::int64(2)}},
-                    Compression::tar, "Unknown"},
-        RequestCase{"UnsignedNone",
-                    {action("CollectBasebandLogs"), {"TraceDumpStatePerformCompression", object::uint64(0)}},
-                    Compression::none, "Unknown"},
-        RequestCase{"CompressionThree",
-                    {action("CollectBasebandLogs"), {"TraceDumpStatePerformCompression", object::int64(3)}},
-                    std::nullopt, ""},
-        RequestCase{"CompressionAsText",
-                    {action("CollectBasebandLogs"), {"TraceDumpStatePerformCompression", object::string("1")}},
-                    std::nullopt, ""},
+        RequestCase{"Tar", {action("CollectBasebandLogs"), compression(object::int64(2))}, Compression::tar, "Unknown"},
+        RequestCase{"UnsignedNone", {action("CollectBasebandLogs"), compression(object::uint64(0))}, Compression::none,
+                    "Unknown"},
+        RequestCase{"CompressionThree", {action("CollectBasebandLogs"), compression(object::int64(3))}, std::nullopt},
+        RequestCase{"CompressionAsText", {action("CollectBasebandLogs"), compression(object::string("1"))},
+                    std::nullopt},
         RequestCase{"CoreDumpReasonFromTheResetReason",
                     {action("CollectTelephonyLogsWithCoredump"), reason("ignored"),
                      {"BasebandResetReason", object::string("watchdog")}},
@@ -127,14 +123,14 @@ INSTANTIATE_TEST_SUITE_P(
         RequestCase{"ReasonOf4KiB", {action("CollectTelephonyLogs"), reason(std::string(4096, 'r'))},
                     Compression::tarGz, std::string(4096, 'r')},
         RequestCase{"ReasonLongerThan4KiB", {action("CollectTelephonyLogs"), reason(std::string(4097, 'r'))},
-                    std::nullopt, ""},
+                    std::nullopt},
         RequestCase{"HugeUnrelatedEntry",
                     {action("CollectTelephonyLogs"), {"Padding", object::string(std::string(70000, 'p'))}},
-                    std::nullopt, ""},
+                    std::nullopt},
         RequestCase{"ReasonNotAString", {action("CollectTelephonyLogs"), {"TraceDumpStateReason", object::int64(1)}},
-                    std::nullopt, ""},
-        RequestCase{"UnknownAction", {action("CollectEverything")}, std::nullopt, ""},
-        RequestCase{"NoAction", {reason("r")}, std::nullopt, ""}),
+                    std::nullopt},
+        RequestCase{"UnknownAction", {action("CollectEverything")}, std::nullopt},
+        RequestCase{"NoAction", {reason("r")}, std::nullopt}),
     [](const auto& paramInfo) { return std::string(paramInfo.param.label); });
 
 TEST(SnapshotScan, FindsTheNewestBasebandSnapshotByTimestamp) {
