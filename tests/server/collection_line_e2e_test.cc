@@ -144,7 +144,6 @@ TEST(ShippedDaemons, RefuseTheTestSwitchesAndTellTheirVersion) {
       {VORND_PATH " --version", 0, "vornd 0.2.0\n", ""},
       {VORN_HELPER_PATH " --version", 0, "vorn-helper 0.2.0\n", ""},
       {VORND_PATH " --state Busy", 2, "", "vornd: unknown option --state (see vornd --help)\n"},
-      {VORND_PATH " --exit-on=Hello", 2, "", "vornd: unknown option --exit-on=Hello (see vornd --help)\n"},
       {VORN_HELPER_PATH " --fail 1", 2, "", "vorn-helper: unknown option --fail (see vorn-helper --help)\n"},
       {VORND_TESTING_PATH " --state", 2, "", "vornd: --state needs a value (see vornd --help)\n"},
   };

@@ -45,7 +45,6 @@ INSTANTIATE_TEST_SUITE_P(
     Vornd, ManagerCommandLines,
     ::testing::Values(Line{"Nothing", {}, OptionsVerdict::run, ""},
                       Line{"Help", {"--help"}, OptionsVerdict::help, "Usage: vornd [OPTION]...\n"},
-                      Line{"Version", {"--version"}, OptionsVerdict::version, "vornd 0.2.0\n"},
                       Line{"RootWithoutValue", {"--root"}, OptionsVerdict::error, "--root needs a value"},
                       Line{"EmptyRoot", {"--root="}, OptionsVerdict::error, "--root wants a folder"},
                       Line{"Unknown", {"--bogus"}, OptionsVerdict::error, "unknown option --bogus"},
@@ -88,8 +87,6 @@ TEST(ManagerCommandLine, TakesTheRootFromTheOptionThenTheEnvironmentThenSlash) {
 TEST(HelperCommandLine, KnowsItsOwnSwitches) {
   HelperOptions options;
   std::string text;
-  EXPECT_EQ(parseHelperOptions({"--version"}, nullptr, &options, &text), OptionsVerdict::version);
-  EXPECT_EQ(text, "vorn-helper 0.2.0\n");
   EXPECT_EQ(parseHelperOptions({"--max-collection-bytes", "1"}, nullptr, &options, &text), OptionsVerdict::error);
   const OptionsVerdict fail = parseHelperOptions({"--fail", "0xE0200002"}, nullptr, &options, &text);
   EXPECT_EQ(fail, kTesting ? OptionsVerdict::run : OptionsVerdict::error) << text;
