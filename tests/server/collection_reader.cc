@@ -51,20 +51,19 @@ std::string CollectedItem::content() const {
   return out;
 }
 
-std::map<std::string, CollectedItem> readArchive(const std::string& path, std::string* error) {
+std::map<std::string, CollectedItem> readCollection(const std::string& path, std::string* error) {
+  if (std::filesystem::is_directory(path)) {
+    // libarchive walks by descriptor: deeper than PATH_MAX, and holes seen
+    // as such.
+    archive* a = archive_read_disk_new();
+    archive_read_disk_set_symlink_physical(a);
+    const size_t parent = std::filesystem::path(path).parent_path().string().size() + 1;
+    return readAll(a, archive_read_disk_open(a, path.c_str()), true, parent, error);
+  }
   archive* a = archive_read_new();
   archive_read_support_filter_all(a);
   archive_read_support_format_all(a);
   return readAll(a, archive_read_open_filename(a, path.c_str(), 64 * 1024), false, 0, error);
-}
-
-std::map<std::string, CollectedItem> readFolder(const std::string& path, std::string* error) {
-  // libarchive walks by descriptor: deeper than PATH_MAX, and holes seen as
-  // such.
-  archive* a = archive_read_disk_new();
-  archive_read_disk_set_symlink_physical(a);
-  const size_t parent = std::filesystem::path(path).parent_path().string().size() + 1;
-  return readAll(a, archive_read_disk_open(a, path.c_str()), true, parent, error);
 }
 
 }  // namespace vorn::test

@@ -25,7 +25,6 @@ struct CollectedItem {
 
 /// Entry name (or path relative to the folder's parent) -> item; names are
 /// bytes. An empty map, with `error` set, when the collection cannot be read.
-std::map<std::string, CollectedItem> readArchive(const std::string& path, std::string* error);
-std::map<std::string, CollectedItem> readFolder(const std::string& path, std::string* error);
+std::map<std::string, CollectedItem> readCollection(const std::string& path, std::string* error);
 
 }  // namespace vorn::test

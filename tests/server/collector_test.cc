@@ -79,10 +79,9 @@ class CollectorTest : public ::testing::Test {
     return outcome;
   }
 
-  std::map<std::string, CollectedItem> items(Compression compression) const {
+  std::map<std::string, CollectedItem> items() const {
     std::string error;
-    auto out = compression == Compression::none ? vorn::test::readFolder(output_, &error)
-                                                : vorn::test::readArchive(output_, &error);
+    auto out = vorn::test::readCollection(output_, &error);
     EXPECT_EQ(error, "");
     return out;
   }
@@ -136,7 +135,7 @@ TEST_P(CollectionForms, AnEntrySwappedAfterTheListingIsSkippedNotFollowed) {
   auto outcome = collect(GetParam().compression, options);
   ASSERT_TRUE(outcome.ok) << outcome.error;
 
-  auto found = items(GetParam().compression);
+  auto found = items();
   EXPECT_EQ(found[path("vorn/a.log")].content(), "a");
   for (const auto& [name, item] : found) {
     EXPECT_EQ(item.content().find(kSecret), std::string::npos) << name;
@@ -163,7 +162,7 @@ TEST_P(CollectionForms, OutputsAreNoMoreOpenThanTheirSources) {
   struct stat st {};
   ASSERT_EQ(::stat(output_.c_str(), &st), 0);
   EXPECT_EQ(st.st_mode & 07777, GetParam().compression == Compression::none ? 0750u : 0640u);
-  auto found = items(GetParam().compression);
+  auto found = items();
   const std::map<std::string, mode_t> expected = {{prefix_, 0750},
                                                   {path("vorn"), 0750},
                                                   {path("vorn/private.log"), 0600},
@@ -182,7 +181,7 @@ TEST_P(CollectionForms, NamesGoInAsTheirBytes) {
   for (const auto& name : names) write(logs() / name, "data of " + name);
   auto outcome = collect(GetParam().compression);
   ASSERT_TRUE(outcome.ok) << outcome.error;
-  auto found = items(GetParam().compression);
+  auto found = items();
   for (const auto& name : names) {
     ASSERT_EQ(found.count(path("vorn/" + name)), 1u) << name;
     EXPECT_EQ(found[path("vorn/" + name)].content(), "data of " + name);
@@ -214,7 +213,7 @@ TEST_P(CollectionForms, ATreeDeeperThanPathMaxIsCollectedDownToTheDepthLimit) {
   for (int i = 1; i <= 63; ++i) deepest += "/" + level;
   tooDeep = deepest + "/" + level;
   ASSERT_GT(path(deepest).size(), size_t(PATH_MAX));
-  auto found = items(GetParam().compression);
+  auto found = items();
   EXPECT_EQ(found[path(deepest + "/f.log")].content(), "63");
   EXPECT_EQ(found.count(path(tooDeep)), 0u);
   EXPECT_NE(found[path("manifest.txt")].content().find(tooDeep + "/  [skipped: deeper than 64 folders]"),
@@ -237,7 +236,7 @@ TEST_P(CollectionForms, SparseFilesAreStoredByWhatTheyHold) {
   if (GetParam().compression != Compression::none) {
     EXPECT_LT(fs::file_size(output_), 1u << 20);
   }
-  auto found = items(GetParam().compression);
+  auto found = items();
   const CollectedItem& item = found[path("vorn/sparse.bin")];
   EXPECT_EQ(item.size, 2 * kGiB);
   EXPECT_LT(item.stored, 1 << 20);
@@ -299,7 +298,7 @@ TEST_F(CollectorTest, TheSizeLimitCutsWhatIsBeyondItAndTheManifestSaysSo) {
   options.maxBytes = 10000;
   auto outcome = collect(Compression::tarGz, options);
   ASSERT_TRUE(outcome.ok) << outcome.error;
-  auto found = items(Compression::tarGz);
+  auto found = items();
   // The walk's order is the file system's: whole, cut, then left out.
   std::vector<size_t> sizes;
   for (const char* name : {"a.log", "b.log", "c.log"}) {
@@ -394,7 +393,7 @@ TEST_F(CollectorTest, ArchivesListAndUnpackWithTheSystemTar) {
 TEST_F(CollectorTest, AMissingSourceIsNothingLoggedYetButAFileInItsPlaceFails) {
   auto outcome = collect(Compression::tarGz);
   ASSERT_TRUE(outcome.ok) << outcome.error;
-  auto found = items(Compression::tarGz);
+  auto found = items();
   EXPECT_EQ(found.count(path("vorn")), 0u);
   EXPECT_EQ(found.count(path("manifest.txt")), 1u);
 
