@@ -12,16 +12,14 @@ readonly repo="$(cd "$(dirname "${BASH_SOURCE[0]}")/../.." && pwd)"
 readonly tree="$stage$prefix"
 failures=0
 
-ok() { echo "ok - $*"; }
-not_ok() {
-  echo "not ok - $*"
-  failures=$((failures + 1))
-}
 # check DESCRIPTION COMMAND...: passes when the command succeeds.
 check() {
   local what="$1"
   shift
-  if "$@"; then ok "$what"; else not_ok "$what"; fi
+  "$@" && { echo "ok - $what"; return; }
+  echo "not ok - $what"
+  failures=$((failures + 1))
+  return 1
 }
 # has FILE LINE...: passes when FILE holds every LINE whole.
 has() {
@@ -34,10 +32,7 @@ has() {
 # same DESCRIPTION EXPECTED ACTUAL: passes when the texts are equal, and
 # shows how they differ when not.
 same() {
-  if [[ "$3" == "$2" ]]; then ok "$1"; else
-    not_ok "$1"
-    diff <(printf '%s\n' "$2") <(printf '%s\n' "$3") | sed 's/^/#   /'
-  fi
+  check "$1" test "$3" = "$2" || diff <(printf '%s\n' "$2") <(printf '%s\n' "$3") | sed 's/^/#   /'
 }
 skip() {
   echo "skip - $*"
@@ -101,12 +96,11 @@ EOF
   check "vorntool --version says vorntool $version, before any start-up check ($status, \"$out\")" \
     test "$status:$out" = "0:vorntool $version"
 
-  local libraries
-  libraries="$(ldd "$tree/bin/vorntool")"
-  check "vorntool does not need libarchive" bash -c '! grep -q libarchive <<<"$1"' _ "$libraries"
-  libraries="$(ldd "$tree/libexec/vorn/vornd")"
-  check "vornd needs libarchive and libsystemd" bash -c 'grep -q libarchive <<<"$1" && grep -q libsystemd <<<"$1"' \
-    _ "$libraries"
+  check "vorntool does not need libarchive" \
+    bash -c 'libraries="$(ldd "$1")" && ! grep -q libarchive <<<"$libraries"' _ "$tree/bin/vorntool"
+  check "vornd needs libarchive and libsystemd" \
+    bash -c 'libraries="$(ldd "$1")" && grep -q libarchive <<<"$libraries" && grep -q libsystemd <<<"$libraries"' \
+    _ "$tree/libexec/vorn/vornd"
   finish
 }
 

@@ -14,20 +14,37 @@
 #include "toolbase/server_state.h"
 #include "toolbase/tool_context.h"
 
-/// A logdump command wired to a scripted server, device and helper service.
+/// Writes where the progress line would begin and end into standard output,
+/// so that a test sees them among the result lines.
+struct MarkedProgress : Progress {
+  void begin(Activity activity) override {
+    std::cout << (activity == Activity::waitingForServer ? "[waiting]" : "[exporting]") << std::flush;
+  }
+  void setCount(std::uint64_t count) override { counts.push_back(count); }
+  void end() override { std::cout << "[end]" << std::flush; }
+  std::vector<std::uint64_t> counts;
+};
+
+/// What a collection prints first: its line, begun before the first request
+/// and ended once, before the result.
+inline const std::string kWaited = "[waiting][end]";
+
+/// A logdump command wired to a scripted server, device and helper service,
+/// its progress line marked in standard output.
 class LogdumpTest : public testing::Test {
  protected:
   void SetUp() override { restart(); }
 
-  /// Starts over with a new scripted server and `progress` as the line.
-  void restart(std::shared_ptr<Progress> progress = silentProgress()) {
+  /// Starts over with a new scripted server.
+  void restart() {
     manager = std::make_shared<FakeManager>(queue);
     auto helpers = [this](const char* client, std::shared_ptr<rilx::LogServer>) {
       helper->client = client;
       return helperAvailable ? std::shared_ptr<vorn::HelperClient>(helper) : nullptr;
     };
-    command = LogdumpCommand::create(
-        "logdump", {}, {.manager = manager, .queue = queue, .device = profile, .helpers = helpers, .progress = progress});
+    command = LogdumpCommand::create("logdump", {},
+                                     {.manager = manager, .queue = queue, .device = profile, .helpers = helpers,
+                                      .progress = std::make_shared<MarkedProgress>()});
   }
 
   struct Run {

@@ -87,7 +87,7 @@ TEST_F(TelephonyCollection, CompletionPrintsResultAndPath) {
     manager->answer("TraceDumpState", c.dump);
     auto r = run(c.handler, c.typed);
     EXPECT_TRUE(r.result) << c.out;  // the collection's outcome never fails the command
-    EXPECT_EQ(r.out, c.out);
+    EXPECT_EQ(r.out, kWaited + c.out);
     EXPECT_EQ(r.err, "");
   }
 }

@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: MIT
 // The export over a scripted store, and the oslog command in front of it.
-#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include "logdump/oslog_command.h"
@@ -15,81 +14,86 @@ namespace {
 using namespace std::chrono_literals;
 using oslog_test::messageEvent;
 using oslog_test::readFile;
-using testing::ElementsAre;
 using Words = std::vector<std::string>;
 
 std::int64_t secondsAgo(std::int64_t s) { return ::time(nullptr) - s; }
 std::string lineFor(const logstore::Event& e) { std::string out; oslog::LineFormatter().append(e, out); return out; }
 
-/// Runs the export over a scripted store, keeping what it logged.
-class AnExportOverAFakeStore : public testing::Test {
- protected:
-  bool run(oslog_test::FakeScript script, double history = 600, std::chrono::nanoseconds timeout = 10s) {
-    oslog_test::FakeStore store(std::move(script));
-    return OsLogStream::putOsLogStreamToFile(store, out_, {}, {}, history, timeout);
-  }
-  std::vector<std::string> logged() const { return capture_.messages(); }
-
-  oslog_test::TempDir dir_;
-  std::string out_ = dir_.path + "/oslog.txt";
-  logstore::SystemLogCapture capture_;
+/// What an observer was told, in order.
+struct RecordingObserver : oslog::ExportObserver {
+  void started() override { calls.push_back("started"); }
+  void linesWritten(std::uint64_t lines) override { calls.push_back(std::to_string(lines)); }
+  void finished() override { calls.push_back("finished"); }
+  std::vector<std::string> calls;
 };
 
-TEST_F(AnExportOverAFakeStore, ReplacesTheFileWithTheSpansMessagesInOrder) {
-  std::ofstream(out_) << std::string(100000, 'x');
+/// An export into a folder of its own, over a file that is already there.
+class AnExportOverAFakeStore : public testing::Test {
+ protected:
+  oslog_test::TempDir dir_;
+  std::string out_ = dir_.path + "/oslog.txt";
+};
+
+TEST_F(AnExportOverAFakeStore, ReplacesTheFileWithTheSpansMessagesOrFailsAndSaysWhy) {
+  const auto kept = messageEvent(secondsAgo(2), "Telhub", "kept");
   auto first = messageEvent(secondsAgo(300), "Telhub", "first"), other = messageEvent(secondsAgo(200), "T", "x"),
        second = messageEvent(secondsAgo(100), "pwrkeepd", "second");
   other.type = logstore::kEventTypeOther;
-  EXPECT_TRUE(run({{messageEvent(secondsAgo(700), "Telhub", "too old"), first, other, second}}));
-  EXPECT_EQ(readFile(out_), lineFor(first) + lineFor(second));
-  EXPECT_THAT(logged(), ElementsAre("Getting oslog stream: history = 600.000000"));
-}
-
-TEST_F(AnExportOverAFakeStore, ZeroHistoryGivesAnEmptyFileAndSuccess) {
-  EXPECT_TRUE(run({{messageEvent(secondsAgo(1), "Telhub", "before the call")}}, 0));
-  EXPECT_EQ(std::filesystem::file_size(out_), 0u);
-}
-
-class AStreamEnding : public AnExportOverAFakeStore, public testing::WithParamInterface<std::uint64_t> {};
-
-TEST_P(AStreamEnding, SucceedsWhateverTheReasonAndLogsAbnormalOnes) {
-  const std::uint64_t reason = GetParam();
-  EXPECT_TRUE(run({{messageEvent(secondsAgo(1), "Telhub", "kept")}, reason}, 60));
-  std::vector<std::string> expected{"Getting oslog stream: history = 60.000000"};
-  if (reason != logstore::kReasonEnded) expected.push_back("Invalid oslog stream: reason = " + std::to_string(reason));
-  EXPECT_EQ(logged(), expected);
-  EXPECT_EQ(oslog_test::splitLines(readFile(out_)).size(), 1u);
-}
-
-INSTANTIATE_TEST_SUITE_P(Reasons, AStreamEnding,
-                         testing::Values(logstore::kReasonEnded, logstore::kReasonReadError, std::uint64_t{1234}),
-                         [](const testing::TestParamInfo<std::uint64_t>& paramInfo) {
-                           return "Reason" + std::to_string(paramInfo.param);
-                         });
-
-TEST_F(AnExportOverAFakeStore, TimeoutInvalidatesFailsAndKeepsThePartialFile) {
-  auto delivered = messageEvent(secondsAgo(2), "Telhub", "delivered before the wait ran out");
-  const auto began = std::chrono::steady_clock::now();
-  EXPECT_FALSE(run({{delivered}, /*endReason=*/std::nullopt}, 30, 100ms));
-  EXPECT_LT(std::chrono::steady_clock::now() - began, 5s);
-  EXPECT_EQ(readFile(out_), lineFor(delivered));
-  EXPECT_THAT(logged(), ElementsAre("Getting oslog stream: history = 30.000000", "Invalid oslog stream: reason = 1",
-                                    "Timeout on getting oslog stream"));
-}
-
-TEST_F(AnExportOverAFakeStore, UnopenableStoreFailsWithoutCreatingTheFile) {
+  const std::vector<logstore::Event> many(513, messageEvent(secondsAgo(5), "Telhub", "m"));
+  std::string manyLines;
+  for (const auto& e : many) manyLines += lineFor(e);
   oslog_test::FakeScript unopenable;
   unopenable.openError = "No such file or directory";
-  EXPECT_FALSE(run(unopenable));
-  EXPECT_FALSE(std::filesystem::exists(out_));
-  EXPECT_THAT(logged(), ElementsAre("Could not open: No such file or directory", "Failed to prepare oslog stream"));
-}
-
-TEST_F(AnExportOverAFakeStore, PathInAMissingFolderFailsAndLogsThePath) {
-  out_ = dir_.path + "/missing/oslog.txt";
-  EXPECT_FALSE(run({}));
-  EXPECT_FALSE(std::filesystem::exists(out_));
-  EXPECT_THAT(logged(), ElementsAre("Failed to create file: " + out_));
+  const std::string unopened = dir_.path + "/unopened.txt", missing = dir_.path + "/missing/oslog.txt";
+  const std::string began600 = "Getting oslog stream: history = 600.000000";
+  const std::string began60 = "Getting oslog stream: history = 60.000000";
+  struct Case {
+    const char* what;
+    oslog_test::FakeScript script;
+    double history;
+    std::string path;
+    bool ok;
+    std::optional<std::string> file;  // none: not created
+    Words logged;
+    Words observed;
+  };
+  const Case cases[] = {
+      {"the span's messages in order", {{messageEvent(secondsAgo(700), "Telhub", "too old"), first, other, second}},
+       600, out_, true, lineFor(first) + lineFor(second), {began600}, {"started", "2", "finished"}},
+      {"counted in blocks", {many}, 600, out_, true, manyLines, {began600}, {"started", "256", "512", "513", "finished"}},
+      {"zero history", {{kept}}, 0, out_, true, "", {"Getting oslog stream: history = 0.000000"},
+       {"started", "0", "finished"}},
+      {"read error", {{kept}, logstore::kReasonReadError}, 60, out_, true, lineFor(kept),
+       {began60, "Invalid oslog stream: reason = " + std::to_string(logstore::kReasonReadError)},
+       {"started", "1", "finished"}},
+      {"unknown end", {{kept}, 1234}, 60, out_, true, lineFor(kept), {began60, "Invalid oslog stream: reason = 1234"},
+       {"started", "1", "finished"}},
+      {"timed out, partial file kept", {{kept}, std::nullopt}, 30, out_, false, lineFor(kept),
+       {"Getting oslog stream: history = 30.000000", "Invalid oslog stream: reason = 1",
+        "Timeout on getting oslog stream"},
+       {"started", "1", "finished"}},
+      {"store not opened", unopenable, 600, unopened, false, std::nullopt,
+       {"Could not open: No such file or directory", "Failed to prepare oslog stream"}, {}},
+      {"folder missing", {many}, 600, missing, false, std::nullopt, {"Failed to create file: " + missing}, {}},
+  };
+  for (const auto& c : cases) {
+    std::ofstream(out_) << std::string(100000, 'x');
+    logstore::SystemLogCapture capture;
+    oslog_test::FakeStore store(c.script);
+    RecordingObserver observer;
+    // Only a store that never ends waits the timeout out.
+    const auto timeout = c.script.endReason ? std::chrono::nanoseconds(10s) : 100ms;
+    const auto start = std::chrono::steady_clock::now();
+    EXPECT_EQ(OsLogStream::putOsLogStreamToFile(store, c.path, {}, {}, c.history, timeout, &observer), c.ok) << c.what;
+    EXPECT_LT(std::chrono::steady_clock::now() - start, 5s) << c.what;
+    if (c.file) {
+      EXPECT_EQ(readFile(c.path), *c.file) << c.what;
+    } else {
+      EXPECT_FALSE(std::filesystem::exists(c.path)) << c.what;
+    }
+    EXPECT_EQ(capture.messages(), c.logged) << c.what;
+    EXPECT_EQ(observer.calls, c.observed) << c.what;
+  }
 }
 
 TEST_F(AnExportOverAFakeStore, AFailedWriteFailsTheExport) {
@@ -102,49 +106,17 @@ TEST_F(AnExportOverAFakeStore, AFailedWriteFailsTheExport) {
     std::string path;
     std::string error;
   } const cases[] = {{"/dev/full", "No space left on device"}, {out_, "File too large"}};
+  logstore::SystemLogCapture capture;
   std::vector<std::string> expected;
   for (const auto& c : cases) {
     vorn::test::FileSizeLimit disk(limit);
-    out_ = c.path;
-    EXPECT_FALSE(run({lines})) << c.path;
+    oslog_test::FakeStore store(oslog_test::FakeScript{lines});
+    EXPECT_FALSE(OsLogStream::putOsLogStreamToFile(store, c.path, {}, {}, 600)) << c.path;
     expected.insert(expected.end(), {"Getting oslog stream: history = 600.000000",
                                      "Failed to write file: " + c.path + " (" + c.error + ")"});
   }
-  EXPECT_EQ(logged(), expected);
+  EXPECT_EQ(capture.messages(), expected);
   EXPECT_EQ(std::filesystem::file_size(out_), limit);
-}
-
-/// What an observer was told, in order.
-struct RecordingObserver : oslog::ExportObserver {
-  void started() override { calls.push_back("started"); }
-  void linesWritten(std::uint64_t lines) override { calls.push_back(std::to_string(lines)); }
-  void finished() override { calls.push_back("finished"); }
-  std::vector<std::string> calls;
-};
-
-TEST_F(AnExportOverAFakeStore, TellsItsObserverOfTheStreamOnlyWhileOneRuns) {
-  struct Case {
-    const char* what;
-    oslog_test::FakeScript script;
-    std::string path;
-    std::vector<std::string> calls;
-  };
-  std::vector<logstore::Event> many(513, messageEvent(secondsAgo(5), "Telhub", "m"));
-  oslog_test::FakeScript unopenable;
-  unopenable.openError = "gone";
-  const Case cases[] = {
-      {"lines", {many}, out_, {"started", "256", "512", "513", "finished"}},
-      {"no lines", {}, out_, {"started", "0", "finished"}},
-      {"timed out", {{many[0]}, std::nullopt}, out_, {"started", "1", "finished"}},
-      {"store not opened", unopenable, out_, {}},
-      {"file not created", {many}, dir_.path + "/missing/x.txt", {}},
-  };
-  for (const auto& c : cases) {
-    oslog_test::FakeStore store(c.script);
-    RecordingObserver observer;
-    OsLogStream::putOsLogStreamToFile(store, c.path, {}, {}, 60, 200ms, &observer);
-    EXPECT_EQ(observer.calls, c.calls) << c.what;
-  }
 }
 
 /// A handler's word list for words in command-line order.

@@ -117,16 +117,6 @@ TEST_F(AnExportFromTheJournal, MapsJournalFieldsOntoTheLineFromTheStartDateOn) {
   EXPECT_THAT(exportLines({}, {}, 1), testing::IsEmpty());
 }
 
-TEST_F(AnExportFromTheJournal, PrintsTheLocalWallClock) {
-  auto firstDate = [&](const char* tz) {
-    oslog_test::ScopedEnv zone("TZ", tz);
-    std::tm tm{};
-    strptime(exportLines({"Telhub"}, {}).at(0).c_str(), "%Y-%m-%d %H:%M:%S", &tm);
-    return timegm(&tm);
-  };
-  EXPECT_EQ(firstDate("<+02>-2") - firstDate("UTC"), 7200);
-}
-
 TEST_F(AnExportFromTheJournal, ShowsEachLineAtItsOwnOffsetAcrossAChangeOfTheClock) {
   // A zone one hour east that puts its clock on at half past an hour in the
   // middle of the fixture's day (rules count the days of the year from 0).
