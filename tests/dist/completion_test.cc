@@ -159,7 +159,6 @@ TEST_P(CompletionScripts, OfferWhatThePromptOffers) {
 }
 
 TEST_P(CompletionScripts, OfferWhatOnlyACommandLineHas) {
-  EXPECT_EQ(offered({{}, "--"}), Words{"--version"});
   // The export's output path is a file name, and only that.
   EXPECT_EQ(offered({{"logdump", "oslog", "60"}, ""}), Words{kFile});
   EXPECT_EQ(offered({{"logdump", "oslog", "60"}, "o"}), Words{kFile});

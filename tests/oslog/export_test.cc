@@ -47,6 +47,7 @@ TEST_F(AnExportOverAFakeStore, ReplacesTheFileWithTheSpansMessagesOrFailsAndSays
   const std::string unopened = dir_.path + "/unopened.txt", missing = dir_.path + "/missing/oslog.txt";
   const std::string began600 = "Getting oslog stream: history = 600.000000";
   const std::string began60 = "Getting oslog stream: history = 60.000000";
+  const Words oneLine = {"started", "1", "finished"};
   struct Case {
     const char* what;
     oslog_test::FakeScript script;
@@ -60,18 +61,18 @@ TEST_F(AnExportOverAFakeStore, ReplacesTheFileWithTheSpansMessagesOrFailsAndSays
   const Case cases[] = {
       {"the span's messages in order", {{messageEvent(secondsAgo(700), "Telhub", "too old"), first, other, second}},
        600, out_, true, lineFor(first) + lineFor(second), {began600}, {"started", "2", "finished"}},
-      {"counted in blocks", {many}, 600, out_, true, manyLines, {began600}, {"started", "256", "512", "513", "finished"}},
+      {"counted in blocks", {many}, 600, out_, true, manyLines, {began600},
+       {"started", "256", "512", "513", "finished"}},
       {"zero history", {{kept}}, 0, out_, true, "", {"Getting oslog stream: history = 0.000000"},
        {"started", "0", "finished"}},
       {"read error", {{kept}, logstore::kReasonReadError}, 60, out_, true, lineFor(kept),
-       {began60, "Invalid oslog stream: reason = " + std::to_string(logstore::kReasonReadError)},
-       {"started", "1", "finished"}},
+       {began60, "Invalid oslog stream: reason = " + std::to_string(logstore::kReasonReadError)}, oneLine},
       {"unknown end", {{kept}, 1234}, 60, out_, true, lineFor(kept), {began60, "Invalid oslog stream: reason = 1234"},
-       {"started", "1", "finished"}},
+       oneLine},
       {"timed out, partial file kept", {{kept}, std::nullopt}, 30, out_, false, lineFor(kept),
        {"Getting oslog stream: history = 30.000000", "Invalid oslog stream: reason = 1",
         "Timeout on getting oslog stream"},
-       {"started", "1", "finished"}},
+       oneLine},
       {"store not opened", unopenable, 600, unopened, false, std::nullopt,
        {"Could not open: No such file or directory", "Failed to prepare oslog stream"}, {}},
       {"folder missing", {many}, 600, missing, false, std::nullopt, {"Failed to create file: " + missing}, {}},

@@ -47,8 +47,9 @@ std::string processOf(const std::string& line) {
 class AnExportFromTheJournal : public testing::Test {
  protected:
   void SetUp() override { if (counts().empty()) GTEST_SKIP() << "no journal fixture in " VORN_OSLOG_FIXTURE_DIR; }
-  Words exportLines(Words processes, Words images, double history = kAllOfIt) {
-    ok_ = OsLogStream::putOsLogStreamToFile(out_, processes, images, history);
+  /// The lines of an export of everything in the last `history` seconds.
+  Words exportLines(double history) {
+    ok_ = OsLogStream::putOsLogStreamToFile(out_, {}, {}, history);
     return splitLines(readFile(out_));
   }
 
@@ -102,7 +103,7 @@ INSTANTIATE_TEST_SUITE_P(
     [](const testing::TestParamInfo<FilterCase>& paramInfo) { return std::string(paramInfo.param.name); });
 
 TEST_F(AnExportFromTheJournal, MapsJournalFieldsOntoTheLineFromTheStartDateOn) {
-  auto lines = exportLines({}, {}, 48 * 3600.0);  // the fixture spans the 24 hours before it was made
+  auto lines = exportLines(48 * 3600.0);  // the fixture spans the 24 hours before it was made
   ASSERT_TRUE(ok_);
   ASSERT_EQ(static_cast<long>(lines.size()), counts()["messages"]);
   EXPECT_EQ(std::count_if(lines.begin(), lines.end(), [](auto& l) { return l.find("\uFFFD") != std::string::npos; }),
@@ -114,7 +115,7 @@ TEST_F(AnExportFromTheJournal, MapsJournalFieldsOntoTheLineFromTheStartDateOn) {
                            " 14 kworker/0:1(kworker/0:1):"})       // process from _COMM without _EXE
     EXPECT_NE(all.find(part), std::string::npos) << part;
   EXPECT_LT(lines.front().substr(0, 19), lines.back().substr(0, 19)) << "each line has its own date";
-  EXPECT_THAT(exportLines({}, {}, 1), testing::IsEmpty());
+  EXPECT_THAT(exportLines(1), testing::IsEmpty());
 }
 
 TEST_F(AnExportFromTheJournal, ShowsEachLineAtItsOwnOffsetAcrossAChangeOfTheClock) {
@@ -130,7 +131,7 @@ TEST_F(AnExportFromTheJournal, ShowsEachLineAtItsOwnOffsetAcrossAChangeOfTheCloc
   auto datesIn = [&](const std::string& tz) {
     oslog_test::ScopedEnv env("TZ", tz);
     std::vector<std::time_t> dates;
-    for (const auto& line : exportLines({}, {}, 48 * 3600.0)) {
+    for (const auto& line : exportLines(48 * 3600.0)) {
       std::tm tm{};
       strptime(line.c_str(), "%Y-%m-%d %H:%M:%S", &tm);
       dates.push_back(timegm(&tm));
