@@ -1,7 +1,9 @@
 // SPDX-License-Identifier: MIT
-// The export over a scripted store, and the oslog command in front of it.
+// The export over a scripted store, as the tool shows it, and the oslog
+// command in front of it.
 #include <gtest/gtest.h>
 
+#include "logdump/export_progress.h"
 #include "logdump/oslog_command.h"
 #include "oslog/line_formatter.h"
 #include "oslog/os_log_stream.h"
@@ -19,11 +21,11 @@ using Words = std::vector<std::string>;
 std::int64_t secondsAgo(std::int64_t s) { return ::time(nullptr) - s; }
 std::string lineFor(const logstore::Event& e) { std::string out; oslog::LineFormatter().append(e, out); return out; }
 
-/// What an observer was told, in order.
-struct RecordingObserver : oslog::ExportObserver {
-  void started() override { calls.push_back("started"); }
-  void linesWritten(std::uint64_t lines) override { calls.push_back(std::to_string(lines)); }
-  void finished() override { calls.push_back("finished"); }
+/// What the tool's progress line was told of an export, in order.
+struct RecordingProgress : Progress {
+  void begin(Activity activity) override { calls.push_back(activity == Activity::exporting ? "exporting" : "other"); }
+  void setCount(std::uint64_t count) override { calls.push_back(std::to_string(count)); }
+  void end() override { calls.push_back("end"); }
   std::vector<std::string> calls;
 };
 
@@ -47,7 +49,7 @@ TEST_F(AnExportOverAFakeStore, ReplacesTheFileWithTheSpansMessagesOrFailsAndSays
   const std::string unopened = dir_.path + "/unopened.txt", missing = dir_.path + "/missing/oslog.txt";
   const std::string began600 = "Getting oslog stream: history = 600.000000";
   const std::string began60 = "Getting oslog stream: history = 60.000000";
-  const Words oneLine = {"started", "1", "finished"};
+  const Words oneLine = {"exporting", "1", "end"};
   struct Case {
     const char* what;
     oslog_test::FakeScript script;
@@ -56,15 +58,15 @@ TEST_F(AnExportOverAFakeStore, ReplacesTheFileWithTheSpansMessagesOrFailsAndSays
     bool ok;
     std::optional<std::string> file;  // none: not created
     Words logged;
-    Words observed;
+    Words shown;  // on the progress line
   };
   const Case cases[] = {
       {"the span's messages in order", {{messageEvent(secondsAgo(700), "Telhub", "too old"), first, other, second}},
-       600, out_, true, lineFor(first) + lineFor(second), {began600}, {"started", "2", "finished"}},
+       600, out_, true, lineFor(first) + lineFor(second), {began600}, {"exporting", "2", "end"}},
       {"counted in blocks", {many}, 600, out_, true, manyLines, {began600},
-       {"started", "256", "512", "513", "finished"}},
+       {"exporting", "256", "512", "513", "end"}},
       {"zero history", {{kept}}, 0, out_, true, "", {"Getting oslog stream: history = 0.000000"},
-       {"started", "0", "finished"}},
+       {"exporting", "0", "end"}},
       {"read error", {{kept}, logstore::kReasonReadError}, 60, out_, true, lineFor(kept),
        {began60, "Invalid oslog stream: reason = " + std::to_string(logstore::kReasonReadError)}, oneLine},
       {"unknown end", {{kept}, 1234}, 60, out_, true, lineFor(kept), {began60, "Invalid oslog stream: reason = 1234"},
@@ -81,7 +83,8 @@ TEST_F(AnExportOverAFakeStore, ReplacesTheFileWithTheSpansMessagesOrFailsAndSays
     std::ofstream(out_) << std::string(100000, 'x');
     logstore::SystemLogCapture capture;
     oslog_test::FakeStore store(c.script);
-    RecordingObserver observer;
+    auto progress = std::make_shared<RecordingProgress>();
+    logdump::ExportProgress observer(progress);
     // Only a store that never ends waits the timeout out.
     const auto timeout = c.script.endReason ? std::chrono::nanoseconds(10s) : 100ms;
     const auto start = std::chrono::steady_clock::now();
@@ -93,7 +96,7 @@ TEST_F(AnExportOverAFakeStore, ReplacesTheFileWithTheSpansMessagesOrFailsAndSays
       EXPECT_FALSE(std::filesystem::exists(c.path)) << c.what;
     }
     EXPECT_EQ(capture.messages(), c.logged) << c.what;
-    EXPECT_EQ(observer.calls, c.observed) << c.what;
+    EXPECT_EQ(progress->calls, c.shown) << c.what;
   }
 }
 
