@@ -138,6 +138,9 @@ const object kHelloAnswer =
     dict({{"ServerState", object::string("Started")}, {"Client", object::string("vorntool-test")}});
 const object kStopping = dict({{"ServerState", object::string("Stopping")}});
 
+/// Stands in for a payload delivered anywhere but on the manager's queue.
+const object kOffQueue = object::string("delivered off the queue");
+
 /// The ServerStateChange payloads that a manager delivers, in order.
 class StateLog {
  public:
@@ -146,8 +149,7 @@ class StateLog {
     vorn::client::RegisterEventHandler(m, "ServerStateChange",
                                        [shared = shared_, queue = queue_](object payload, dispatch::group) {
                                          std::lock_guard lock(shared->mutex);
-                                         shared->onQueue &= queue.isCurrent();
-                                         shared->payloads.push_back(payload);
+                                         shared->payloads.push_back(queue.isCurrent() ? payload : kOffQueue);
                                          shared->changed.notify_all();
                                        });
   }
@@ -160,17 +162,12 @@ class StateLog {
     std::lock_guard lock(shared_->mutex);
     return shared_->payloads;
   }
-  bool allOnQueue() {
-    std::lock_guard lock(shared_->mutex);
-    return shared_->onQueue;
-  }
 
  private:
   struct Shared {
     std::mutex mutex;
     std::condition_variable changed;
     std::vector<object> payloads;
-    bool onQueue = true;
   };
   dispatch::queue queue_;
   std::shared_ptr<Shared> shared_ = std::make_shared<Shared>();
@@ -205,16 +202,14 @@ void spoofFrom(const std::string& client) {
             0);
 }
 
-/// Waits, within kPatience, until `name` has no owner on the system bus.
-bool nameGone(const char* name) {
-  sd_bus* raw = nullptr;
-  if (sd_bus_open_system(&raw) < 0) return false;
-  vorn::bus::BusPtr bus(raw);
-  for (auto deadline = std::chrono::steady_clock::now() + kPatience; std::chrono::steady_clock::now() < deadline;
-       std::this_thread::sleep_for(5ms))
-    if (sd_bus_get_name_creds(raw, name, 0, nullptr) < 0) return true;
-  return false;
-}
+/// What an asynchronous call completed with, and whether on the queue.
+struct Completion {
+  std::int32_t status;
+  object response;
+  bool onQueue;
+  bool operator==(const Completion&) const = default;
+};
+void PrintTo(const Completion& c, std::ostream* os) { *os << c.status << (c.onQueue ? " on the queue" : " off it"); }
 
 class ClientOverBus : public ::testing::Test {
  protected:
@@ -233,6 +228,31 @@ class ClientOverBus : public ::testing::Test {
   }
   std::shared_ptr<vorn::client::Manager> manager() {
     return vorn::client::CreateManager("vorntool-test", queue_);
+  }
+  /// A manager followed by `log`, with events on, once Hello's answer and the
+  /// server's event have come.
+  std::shared_ptr<vorn::client::Manager> greeted(StateLog& log) {
+    auto m = manager();
+    log.follow(m);
+    vorn::client::EventsOn(m);
+    EXPECT_TRUE(log.waitFor(2));
+    return m;
+  }
+  /// Releases `m` and waits until its queue has run whatever that completed.
+  void release(std::shared_ptr<vorn::client::Manager>& m) {
+    m.reset();
+    ASSERT_TRUE(drain(queue_));
+  }
+  /// Starts TraceDumpState on `m` without waiting: each completion lands in
+  /// `got`, on the queue only, and `first` empties at the first of them.
+  void performAsync(const std::shared_ptr<vorn::client::Manager>& m, std::vector<Completion>& got,
+                    dispatch::group& first) {
+    first.enter();
+    auto done = [&got, first, queue = queue_](TelephonyXPC::Result r, object response) {
+      got.push_back({r.status, response, queue.isCurrent()});
+      if (got.size() == 1) first.leave();
+    };
+    vorn::client::PerformCommand(m, "TraceDumpState", done, dict({}));
   }
   TelephonyXPC::Result perform(const char* command, object request, object& response) {
     return vorn::client::PerformCommand(manager(), command, std::move(request), response);
@@ -289,10 +309,7 @@ TEST_F(ClientOverBus, RefusesBeforeSendingWhatTheBusWouldDisconnectFor) {
   // containers; an array of variants costs two per level.
   Peer server(false, Act::answer);
   StateLog log(queue_);
-  auto m = manager();
-  log.follow(m);
-  vorn::client::EventsOn(m);
-  ASSERT_TRUE(log.waitFor(2));
+  auto m = greeted(log);
   const std::string connection = server.caller();
   auto items = [](int levels) {
     object v = object::string("bottom");
@@ -320,8 +337,7 @@ TEST_F(ClientOverBus, RefusesBeforeSendingWhatTheBusWouldDisconnectFor) {
   }
   // Still the first connection: a new one would have said Hello again.
   EXPECT_EQ(server.caller(), connection);
-  m.reset();
-  ASSERT_TRUE(drain(queue_));
+  release(m);
   EXPECT_EQ(log.payloads(), (std::vector<object>{kHelloAnswer, kStopping}));
 }
 
@@ -349,23 +365,13 @@ TEST_P(CallFailure, YieldsItsStatusOnceWithinTheTimeout) {
     EXPECT_EQ(perform("TraceDumpState", dict({}), response).status, failure.status);
     EXPECT_TRUE(response.isNull());
   } else {
-    std::vector<std::pair<std::int32_t, object>> got;  // on the queue only
-    bool onQueue = true;
-    dispatch::group done;
-    done.enter();
+    std::vector<Completion> got;
+    dispatch::group first;
     auto m = manager();
-    vorn::client::PerformCommand(m, "TraceDumpState", [&](TelephonyXPC::Result r, object o) {
-      onQueue &= queue_.isCurrent();
-      got.emplace_back(r.status, o);
-      if (got.size() == 1) done.leave();
-    }, dict({}));
-    ASSERT_TRUE(done.wait(kPatience));
-    m.reset();  // would complete anything still pending
-    ASSERT_TRUE(drain(queue_));
-    ASSERT_EQ(got.size(), 1u);
-    EXPECT_EQ(got[0].first, failure.status);
-    EXPECT_TRUE(got[0].second.isNull());
-    EXPECT_TRUE(onQueue);
+    performAsync(m, got, first);
+    ASSERT_TRUE(first.wait(kPatience));
+    release(m);  // would complete anything still pending
+    EXPECT_EQ(got, (std::vector<Completion>{{failure.status, object(), true}}));
   }
   EXPECT_LT(std::chrono::steady_clock::now() - start, kCallTimeout + 3s);
 }
@@ -389,20 +395,15 @@ TEST_F(ClientOverBus, ACallPendingWhenTheManagerOrTheBusGoesCompletesOnceUnanswe
   setenv("VORN_CALL_TIMEOUT_MS", "600000", 1);
   for (const std::string ending : {"manager released", "bus killed"}) {
     Peer server(false, Act::noReply);
-    std::vector<std::int32_t> statuses;  // on the queue only
-    dispatch::group done;
-    done.enter();
+    std::vector<Completion> got;
+    dispatch::group first;
     auto m = manager();
-    vorn::client::PerformCommand(m, "TraceDumpState", [&](TelephonyXPC::Result r, object) {
-      statuses.push_back(r.status);
-      if (statuses.size() == 1) done.leave();
-    }, dict({}));
+    performAsync(m, got, first);
     ASSERT_TRUE(server.waitForCalls(1)) << ending;
     ending == "manager released" ? m.reset() : bus_.reset();
-    ASSERT_TRUE(done.wait(kPatience)) << ending;
-    m.reset();
-    ASSERT_TRUE(drain(queue_));
-    EXPECT_EQ(statuses, std::vector<std::int32_t>{kNoReply}) << ending;
+    ASSERT_TRUE(first.wait(kPatience)) << ending;
+    release(m);
+    EXPECT_EQ(got, (std::vector<Completion>{{kNoReply, object(), true}})) << ending;
   }
 }
 
@@ -428,33 +429,16 @@ TEST_F(ClientOverBus, RefusesCallersThatThePolicyDeniesAndSaysSo) {
   EXPECT_FALSE(m->accessDenied());
 }
 
-TEST_F(ClientOverBus, DeliversServerStateOnTheQueue) {
-  Peer server(false, Act::answer);
-  StateLog log(queue_);
-  auto m = manager();
-  log.follow(m);
-  vorn::client::EventsOn(m);
-  ASSERT_TRUE(log.waitFor(2));
-  m.reset();
-  ASSERT_TRUE(drain(queue_));
-  EXPECT_EQ(log.payloads(), (std::vector<object>{kHelloAnswer, kStopping}));  // Hello's answer, then the event
-  EXPECT_TRUE(log.allOnQueue());
-}
-
 TEST_F(ClientOverBus, IgnoresEventsFromAnyoneButTheServer) {
   Peer server(false, Act::answer);
   StateLog log(queue_);
-  auto m = manager();
-  log.follow(m);
-  vorn::client::EventsOn(m);
-  ASSERT_TRUE(log.waitFor(2));
+  auto m = greeted(log);
   spoofFrom(server.caller());
   // Hello again: its answer and the server's event come after whatever the
   // spoofer's signals turned into.
   vorn::client::EventsOn(m);
   ASSERT_TRUE(log.waitFor(4));
-  m.reset();
-  ASSERT_TRUE(drain(queue_));
+  release(m);
   EXPECT_EQ(log.payloads(), (std::vector<object>{kHelloAnswer, kStopping, kHelloAnswer, kStopping}));
 }
 
@@ -462,10 +446,7 @@ TEST_F(ClientOverBus, ReportsALostServerOnceAndGreetsTheNextOne) {
   std::optional<Peer> server;
   server.emplace(false, Act::answer);
   StateLog log(queue_);
-  auto m = manager();
-  log.follow(m);
-  vorn::client::EventsOn(m);
-  ASSERT_TRUE(log.waitFor(2));
+  auto m = greeted(log);
   server.reset();  // gone without a word, as after SIGKILL
   ASSERT_TRUE(log.waitFor(3));
   server.emplace(false, Act::answer);
@@ -475,13 +456,11 @@ TEST_F(ClientOverBus, ReportsALostServerOnceAndGreetsTheNextOne) {
   // after the owner change on the same connection, so by then it was seen.
   vorn::client::EventsOff(m);
   server.reset();
-  ASSERT_TRUE(nameGone("org.vorn.Manager"));
+  ASSERT_TRUE(vorn::test::waitForBusName("org.vorn.Manager", kPatience, /* owned= */ false));
   object response;
   EXPECT_EQ(vorn::client::PerformCommand(m, "Echo", dict({}), response).status, kNotRunning);
-  m.reset();
-  ASSERT_TRUE(drain(queue_));
+  release(m);
   EXPECT_EQ(log.payloads(), (std::vector<object>{kHelloAnswer, kStopping, dict({}), kHelloAnswer, kStopping}));
-  EXPECT_TRUE(log.allOnQueue());
 }
 
 TEST_F(ClientOverBus, AnswersTracePropertiesFromTheFileWhileTheServerIsDown) {

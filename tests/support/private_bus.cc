@@ -109,17 +109,15 @@ void ChildProcess::kill() {
   pid_ = -1;
 }
 
-bool waitForBusName(const std::string& name, std::chrono::milliseconds limit) {
+bool waitForBusName(const std::string& name, std::chrono::milliseconds limit, bool owned) {
   sd_bus* bus = nullptr;
-  sd_bus_creds* owner = nullptr;
   if (sd_bus_open_system(&bus) < 0) return false;
-  int r;  // fails while the name has no owner
+  bool found;  // the lookup fails while the name has no owner
   for (auto deadline = Clock::now() + limit;
-       (r = sd_bus_get_name_creds(bus, name.c_str(), 0, &owner)) < 0 && Clock::now() < deadline;)
+       (found = sd_bus_get_name_creds(bus, name.c_str(), 0, nullptr) >= 0) != owned && Clock::now() < deadline;)
     std::this_thread::sleep_for(std::chrono::milliseconds(10));
-  sd_bus_creds_unref(owner);
   sd_bus_flush_close_unref(bus);
-  return r >= 0;
+  return found == owned;
 }
 
 }  // namespace vorn::test

@@ -62,8 +62,8 @@ class PrivateBus {
   std::string error_;
 };
 
-/// Waits at most `limit` until `name` has an owner on the system bus; true
-/// when it has one.
-bool waitForBusName(const std::string& name, std::chrono::milliseconds limit);
+/// Waits at most `limit` until `name` has an owner on the system bus (or, when
+/// not `owned`, has none); true when it came to that.
+bool waitForBusName(const std::string& name, std::chrono::milliseconds limit, bool owned = true);
 
 }  // namespace vorn::test
