@@ -126,14 +126,6 @@ class Peer {
 };
 using Act = Peer::Act;
 
-/// Waits until everything queued on `q` so far has run.
-bool drain(const dispatch::queue& q) {
-  dispatch::group done;
-  done.enter();
-  q.async([done] { done.leave(); });
-  return done.wait(kPatience);
-}
-
 const object kHelloAnswer =
     dict({{"ServerState", object::string("Started")}, {"Client", object::string("vorntool-test")}});
 const object kStopping = dict({{"ServerState", object::string("Stopping")}});
@@ -141,36 +133,22 @@ const object kStopping = dict({{"ServerState", object::string("Stopping")}});
 /// Stands in for a payload delivered anywhere but on the manager's queue.
 const object kOffQueue = object::string("delivered off the queue");
 
-/// The ServerStateChange payloads that a manager delivers, in order.
-class StateLog {
- public:
-  explicit StateLog(dispatch::queue queue) : queue_(std::move(queue)) {}
-  void follow(const std::shared_ptr<vorn::client::Manager>& m) {
-    vorn::client::RegisterEventHandler(m, "ServerStateChange",
-                                       [shared = shared_, queue = queue_](object payload, dispatch::group) {
-                                         std::lock_guard lock(shared->mutex);
-                                         shared->payloads.push_back(queue.isCurrent() ? payload : kOffQueue);
-                                         shared->changed.notify_all();
-                                       });
-  }
+/// The ServerStateChange payloads that a manager delivers, in order. The
+/// manager's handler shares it, so a late delivery finds it alive.
+struct StateLog {
   /// Waits, within kPatience, until at least `count` payloads came.
   bool waitFor(std::size_t count) {
-    std::unique_lock lock(shared_->mutex);
-    return shared_->changed.wait_for(lock, kPatience, [&] { return shared_->payloads.size() >= count; });
+    std::unique_lock lock(mutex);
+    return changed.wait_for(lock, kPatience, [&] { return payloads.size() >= count; });
   }
-  std::vector<object> payloads() {
-    std::lock_guard lock(shared_->mutex);
-    return shared_->payloads;
+  std::vector<object> all() {
+    std::lock_guard lock(mutex);
+    return payloads;
   }
 
- private:
-  struct Shared {
-    std::mutex mutex;
-    std::condition_variable changed;
-    std::vector<object> payloads;
-  };
-  dispatch::queue queue_;
-  std::shared_ptr<Shared> shared_ = std::make_shared<Shared>();
+  std::mutex mutex;
+  std::condition_variable changed;
+  std::vector<object> payloads;
 };
 
 /// From a connection of its own, which owns nothing: a ServerStateChange event
@@ -229,19 +207,26 @@ class ClientOverBus : public ::testing::Test {
   std::shared_ptr<vorn::client::Manager> manager() {
     return vorn::client::CreateManager("vorntool-test", queue_);
   }
-  /// A manager followed by `log`, with events on, once Hello's answer and the
+  /// A manager with events on that `log` follows, once Hello's answer and the
   /// server's event have come.
-  std::shared_ptr<vorn::client::Manager> greeted(StateLog& log) {
+  std::shared_ptr<vorn::client::Manager> greeted(const std::shared_ptr<StateLog>& log) {
     auto m = manager();
-    log.follow(m);
+    vorn::client::RegisterEventHandler(m, "ServerStateChange", [log, queue = queue_](object payload, dispatch::group) {
+      std::lock_guard lock(log->mutex);
+      log->payloads.push_back(queue.isCurrent() ? payload : kOffQueue);
+      log->changed.notify_all();
+    });
     vorn::client::EventsOn(m);
-    EXPECT_TRUE(log.waitFor(2));
+    EXPECT_TRUE(log->waitFor(2));
     return m;
   }
   /// Releases `m` and waits until its queue has run whatever that completed.
   void release(std::shared_ptr<vorn::client::Manager>& m) {
     m.reset();
-    ASSERT_TRUE(drain(queue_));
+    dispatch::group drained;
+    drained.enter();
+    queue_.async([drained] { drained.leave(); });
+    ASSERT_TRUE(drained.wait(kPatience));
   }
   /// Starts TraceDumpState on `m` without waiting: each completion lands in
   /// `got`, on the queue only, and `first` empties at the first of them.
@@ -308,7 +293,7 @@ TEST_F(ClientOverBus, RefusesBeforeSendingWhatTheBusWouldDisconnectFor) {
   // dbus-daemon drops a sender whose value lies inside more than 64
   // containers; an array of variants costs two per level.
   Peer server(false, Act::answer);
-  StateLog log(queue_);
+  auto log = std::make_shared<StateLog>();
   auto m = greeted(log);
   const std::string connection = server.caller();
   auto items = [](int levels) {
@@ -338,7 +323,7 @@ TEST_F(ClientOverBus, RefusesBeforeSendingWhatTheBusWouldDisconnectFor) {
   // Still the first connection: a new one would have said Hello again.
   EXPECT_EQ(server.caller(), connection);
   release(m);
-  EXPECT_EQ(log.payloads(), (std::vector<object>{kHelloAnswer, kStopping}));
+  EXPECT_EQ(log->all(), (std::vector<object>{kHelloAnswer, kStopping}));
 }
 
 /// One way for a call to fail (no peer at all when `act` is unset), seen
@@ -431,26 +416,26 @@ TEST_F(ClientOverBus, RefusesCallersThatThePolicyDeniesAndSaysSo) {
 
 TEST_F(ClientOverBus, IgnoresEventsFromAnyoneButTheServer) {
   Peer server(false, Act::answer);
-  StateLog log(queue_);
+  auto log = std::make_shared<StateLog>();
   auto m = greeted(log);
   spoofFrom(server.caller());
   // Hello again: its answer and the server's event come after whatever the
   // spoofer's signals turned into.
   vorn::client::EventsOn(m);
-  ASSERT_TRUE(log.waitFor(4));
+  ASSERT_TRUE(log->waitFor(4));
   release(m);
-  EXPECT_EQ(log.payloads(), (std::vector<object>{kHelloAnswer, kStopping, kHelloAnswer, kStopping}));
+  EXPECT_EQ(log->all(), (std::vector<object>{kHelloAnswer, kStopping, kHelloAnswer, kStopping}));
 }
 
 TEST_F(ClientOverBus, ReportsALostServerOnceAndGreetsTheNextOne) {
   std::optional<Peer> server;
   server.emplace(false, Act::answer);
-  StateLog log(queue_);
+  auto log = std::make_shared<StateLog>();
   auto m = greeted(log);
   server.reset();  // gone without a word, as after SIGKILL
-  ASSERT_TRUE(log.waitFor(3));
+  ASSERT_TRUE(log->waitFor(3));
   server.emplace(false, Act::answer);
-  ASSERT_TRUE(log.waitFor(5));
+  ASSERT_TRUE(log->waitFor(5));
 
   // With events off a lost server goes unreported. The call's answer comes
   // after the owner change on the same connection, so by then it was seen.
@@ -460,7 +445,7 @@ TEST_F(ClientOverBus, ReportsALostServerOnceAndGreetsTheNextOne) {
   object response;
   EXPECT_EQ(vorn::client::PerformCommand(m, "Echo", dict({}), response).status, kNotRunning);
   release(m);
-  EXPECT_EQ(log.payloads(), (std::vector<object>{kHelloAnswer, kStopping, dict({}), kHelloAnswer, kStopping}));
+  EXPECT_EQ(log->all(), (std::vector<object>{kHelloAnswer, kStopping, dict({}), kHelloAnswer, kStopping}));
 }
 
 TEST_F(ClientOverBus, AnswersTracePropertiesFromTheFileWhileTheServerIsDown) {
