@@ -49,15 +49,6 @@ TEST(ShellLineReader, PromptsThroughTheReaderAndCompletesAtTheWorkingCommand) {
   EXPECT_EQ(seen, (std::vector<std::string>{atRoot, atLogdump, atLogdump, atRoot}));
 }
 
-TEST(ShellLineReader, OneShotSessionsNeverRead) {
-  std::vector<std::string> seen;
-  TestShell shell(kTree);
-  shell.setLineReader(std::make_unique<ScriptedReader>(std::vector<std::string>{"quit"}, &seen));
-  StdioCapture io;
-  EXPECT_FALSE(shell.run({"logdump", "vorntool"}));
-  EXPECT_TRUE(seen.empty());
-}
-
 TEST(ColourOff, HelpAndTheInvalidWordReportKeepTheirTextWithoutEscapes) {
   TestShell shell(kTree);
   colour::setEnabled(false);
