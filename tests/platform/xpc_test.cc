@@ -10,11 +10,8 @@ TEST(XpcDict, KeepsInsertionOrderAndReplacesInPlace) {
   d.set("b", xpc::object::string("1"));
   d.set("a", xpc::object::int64(2));
   d.set("b", xpc::object::boolean(false));
-  const auto& entries = *d.obj().asEntries();
-  ASSERT_EQ(entries.size(), 2u);
-  EXPECT_EQ(entries[0].first, "b");
-  EXPECT_EQ(entries[0].second, xpc::object::boolean(false));
-  EXPECT_EQ(entries[1].first, "a");
+  const std::vector<xpc::entry> expected = {{"b", xpc::object::boolean(false)}, {"a", xpc::object::int64(2)}};
+  EXPECT_EQ(*d.obj().asEntries(), expected);
   EXPECT_EQ(d.get("a"), xpc::object::int64(2));
   EXPECT_TRUE(d.get("missing").isNull());
 }
