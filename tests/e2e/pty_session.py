@@ -2,17 +2,18 @@
 # SPDX-License-Identifier: MIT
 """Runs a program on a pseudo-terminal and plays a script of keys against it.
 
-    pty_session.py [--stdout FILE] [--screen FILE] [--cols N] [--timeout S] STEPS -- COMMAND [ARG...]
+    pty_session.py [--stdout FILE] [--screen FILE] [--timeout S] [STEP...] -- COMMAND [ARG...]
 
-STEPS is a JSON list of ["send", text] and ["expect", regex]. Keys are sent
-to a line editor: a send first waits, up to the timeout, until the editor
-has the terminal (canonical mode is off), since keys that come before are
-echoed by the terminal and again by the editor, and an end-of-file key may
-be lost. An expectation waits, up to the timeout, for the regex to match the
-terminal's output that arrived after the previous match. After the last step the program must end
-within the timeout. Everything the terminal showed is written to standard
-output. The exit status is the program's, or 99 (with the reason on standard
-error) when an expectation or the end did not come in time.
+Each STEP is send:KEYS or expect:REGEX. Keys are sent to a line editor: a
+send first waits, up to the timeout, until the editor has the terminal
+(canonical mode is off), since keys that come before are echoed by the
+terminal and again by the editor, and an end-of-file key may be lost. An
+expectation waits, up to the timeout, for the regex to match the terminal's
+output that arrived after the previous match. After the last step the
+program must end within the timeout. Everything the terminal showed is
+written to standard output. The exit status is the program's, or 99 (with
+the reason on standard error) when an expectation or the end did not come
+in time.
 
 With --stdout the program's standard output goes to FILE instead of the
 terminal, while its standard input and standard error stay on the terminal.
@@ -25,7 +26,6 @@ are dropped, and trailing blanks and empty last lines are left out.
 
 import argparse
 import fcntl
-import json
 import os
 import re
 import select
@@ -71,7 +71,7 @@ class Terminal:
         return True
 
     def expect(self, pattern, timeout):
-        regex = re.compile(pattern.encode("utf-8"), re.DOTALL)
+        regex = re.compile(pattern, re.DOTALL)
         deadline = time.monotonic() + timeout
         while True:
             found = regex.search(self.seen, self.mark)
@@ -82,62 +82,58 @@ class Terminal:
                 return bool(regex.search(self.seen, self.mark))
 
 
+def play(terminal, steps, timeout):
+    """Plays the steps and reads until the program lets go of the terminal; the reason when that fails."""
+    for step in steps:
+        kind, _, text = step.partition(":")
+        # The bytes as given on the command line, whatever the locale.
+        data = os.fsencode(text)
+        if kind == "send":
+            if not terminal.editing(timeout):
+                return "no line editor took the terminal before %r" % data
+            os.write(terminal.master, data)
+        elif not terminal.expect(data, timeout):
+            return "no match for %r after %r" % (data, terminal.seen[terminal.mark:])
+    if not terminal.drain(time.monotonic() + timeout):
+        return "the program did not end"
+    return None
+
+
 def final_screen(output):
     rows = [[]]
-    row = col = 0
-    text = output.decode("utf-8", "replace")
-    i = 0
-    while i < len(text):
-        c = text[i]
-        i += 1
-        if c == "\r":
+    col = 0
+    # A control sequence, another escape sequence, or one character.
+    for token in re.findall(r"\x1b\[[0-9;?]*[@-~]|\x1b.?|.", output.decode("utf-8", "replace"), re.DOTALL):
+        line = rows[-1]
+        if token == "\r":
             col = 0
-        elif c == "\n":
-            row += 1
-            rows.extend([] for _ in range(row + 1 - len(rows)))
-        elif c == "\b":
+        elif token == "\n":
+            rows.append([])
+        elif token == "\b":
             col = max(0, col - 1)
-        elif c == "\x1b":
-            match = re.compile(r"\[([0-9;?]*)([@-~])").match(text, i)
-            if match:
-                i = match.end()
-                if match.group(2) == "K" and match.group(1) in ("", "0"):
-                    del rows[row][col:]
-            else:
-                i += 1  # a two-character sequence
-        elif c >= " ":
-            line = rows[row]
+        elif token in ("\x1b[K", "\x1b[0K"):
+            del line[col:]
+        elif token >= " ":
             line.extend(" " * (col + 1 - len(line)))
-            line[col] = c
+            line[col] = token
             col += 1
-    lines = ["".join(line).rstrip() for line in rows]
-    while lines and not lines[-1]:
-        lines.pop()
-    return "".join(line + "\n" for line in lines)
-
-
-def fail(terminal, reason):
-    sys.stdout.buffer.write(terminal.seen)
-    sys.stdout.flush()
-    print(reason, file=sys.stderr)
-    return 99
+    text = "\n".join("".join(line).rstrip() for line in rows).rstrip("\n")
+    return text + "\n" if text else ""
 
 
 def main():
+    end = sys.argv.index("--")
     parser = argparse.ArgumentParser()
     parser.add_argument("--stdout")
     parser.add_argument("--screen")
-    parser.add_argument("--cols", type=int, default=80)
     parser.add_argument("--timeout", type=float, default=30.0)
-    parser.add_argument("steps")
-    parser.add_argument("command", nargs=argparse.REMAINDER)
-    args = parser.parse_args()
-    command = args.command[1:] if args.command[:1] == ["--"] else args.command
-    steps = json.loads(args.steps)
+    parser.add_argument("steps", nargs="*")
+    args = parser.parse_args(sys.argv[1:end])
+    command = sys.argv[end + 1:]
 
     master, slave = os.openpty()
     # The size is set before the program starts, so that it reads it at once.
-    fcntl.ioctl(master, termios.TIOCSWINSZ, struct.pack("HHHH", 24, args.cols, 0, 0))
+    fcntl.ioctl(master, termios.TIOCSWINSZ, struct.pack("HHHH", 24, 80, 0, 0))
     stdout = open(args.stdout, "wb") if args.stdout else slave
     child = subprocess.Popen(
         command, stdin=slave, stdout=stdout, stderr=slave, start_new_session=True,
@@ -147,28 +143,19 @@ def main():
         stdout.close()
 
     terminal = Terminal(master)
-    for kind, text in steps:
-        if kind == "send":
-            if not terminal.editing(args.timeout):
-                child.kill()
-                child.wait()
-                return fail(terminal, "no line editor took the terminal before %r" % text)
-            os.write(master, text.encode())
-        elif not terminal.expect(text, args.timeout):
-            child.kill()
-            child.wait()
-            return fail(terminal, "no match for %r after %r" % (text, terminal.seen[terminal.mark:]))
-
-    deadline = time.monotonic() + args.timeout
-    try:
-        if not terminal.drain(deadline):
-            raise subprocess.TimeoutExpired(command, args.timeout)
-        child.wait(timeout=max(0.0, deadline - time.monotonic()))
-    except subprocess.TimeoutExpired:
+    reason = play(terminal, args.steps, args.timeout)
+    if not reason:
+        try:
+            child.wait(timeout=args.timeout)
+        except subprocess.TimeoutExpired:
+            reason = "the program did not end"
+    sys.stdout.buffer.write(terminal.seen)
+    sys.stdout.flush()
+    if reason:
         child.kill()
         child.wait()
-        return fail(terminal, "the program did not end")
-    sys.stdout.buffer.write(terminal.seen)
+        print(reason, file=sys.stderr)
+        return 99
     if args.screen:
         with open(args.screen, "w", encoding="utf-8") as screen:
             screen.write(final_screen(terminal.seen))

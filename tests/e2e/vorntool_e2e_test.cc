@@ -8,15 +8,10 @@
 
 namespace {
 
-using VorntoolAccess = InTheSandbox;
 using VorntoolCollections = InTheSandbox;
-using VorntoolFailures = InTheSandbox;
-using VorntoolFifos = InTheSandbox;
-using VorntoolLostOutput = InTheSandbox;
 using VorntoolOslog = InTheSandbox;
 using VorntoolServerDown = InTheSandbox;
 using VorntoolServerTrust = InTheSandbox;
-using VorntoolStartup = InTheSandbox;
 
 const std::string kSnapshot = "/var/wireless/Library/Logs/CrashReporter/Baseband/";
 const std::string kScratch = "/var/wireless/Library/Logs/ZelmarBasebandManager/DIAG.scratch";
@@ -25,6 +20,17 @@ const std::string kTs = R"(\d{4}-\d\d-\d\d-\d{6}(-\d+)?)";
 
 bool matches(const std::string& text, const std::string& pattern) {
   return std::regex_match(text, std::regex(pattern));
+}
+
+// Regexes for what the tool prints.
+const std::string kPromptRe = "\\(/vorntool\\)>> ";
+const std::string kTelRe = "Telephony log collection: Success";
+const std::string kBbRe = "Baseband log collection: Success \\(Vorn running\\)";
+const std::string kTarGzRe = "\\.tar\\.gz";
+
+/// A collection's heading, then the path of what it collected.
+std::string collectedRe(const std::string& heading, const std::string& suffix) {
+  return heading + "\nPath = " + kSnapshot + "log-bb-" + kTs + suffix + "\n";
 }
 
 TEST_F(VorntoolCollections, PrintPathsThatExistUnderTheRoot) {
@@ -42,42 +48,14 @@ TEST_F(VorntoolCollections, PrintPathsThatExistUnderTheRoot) {
     done)sh");
   ASSERT_EQ(r.status, 0) << r.err;
   EXPECT_EQ(r.err, "");
-  const std::string& dir = kSnapshot;
-  EXPECT_TRUE(matches(r.out,
-                      "status 0\nTelephony log collection: Success\nPath = " + dir + "log-bb-" + kTs +
-                          "\\.tar\\.gz\nexists\n[^\n]*manifest\\.txt[^\n]*\n"
-                          "status 0\nTelephony log collection with Coredump: Success\nPath = " + dir +
-                          "log-bb-" + kTs + "-coredump\nexists\n"
-                          "status 0\nBaseband log collection: Success \\(Vorn running\\)\nPath = " + dir +
-                          "log-bb-" + kTs + "\\.tar\\.gz\nexists\n[^\n]*manifest\\.txt[^\n]*\n"
-                          "status 0\nBaseband log collection: Success \\(Vorn running\\)\nPath = " + dir +
-                          "log-bb-" + kTs + "-bb-trace\nexists\n"
-                          "status 0\nTelephony log collection: Success\nPath = " + dir + "log-bb-" + kTs +
-                          "\\.tar\nexists\n[^\n]*manifest\\.txt[^\n]*\n"))
+  const std::string listed = "exists\n[^\n]*manifest\\.txt[^\n]*\n";
+  EXPECT_TRUE(matches(r.out, "status 0\n" + collectedRe(kTelRe, kTarGzRe) + listed +
+                                 "status 0\n" + collectedRe("Telephony log collection with Coredump: Success", "-coredump") +
+                                 "exists\n" +
+                                 "status 0\n" + collectedRe(kBbRe, kTarGzRe) + listed +
+                                 "status 0\n" + collectedRe(kBbRe, "-bb-trace") + "exists\n" +
+                                 "status 0\n" + collectedRe(kTelRe, "\\.tar") + listed))
       << r.out;
-}
-
-TEST_F(VorntoolServerDown, RefusesServerCommandsButLocatesBasebandLogs) {
-  auto r = runInSandbox({"--no-vornd"}, "vorntool logdump tel crash");
-  EXPECT_EQ(r.status, 1);
-  EXPECT_EQ(r.out, "");
-  EXPECT_EQ(r.err, kServerDown);
-
-  for (const char* build : {"build=internal", "build=customer"}) {
-    r = runInSandbox({"--no-vornd", "--device", build}, R"sh(
-      mkdir -p "$VORN_ROOT/var/wireless/Library/Logs/CrashReporter/Baseband/log-bb-2026-01-02-030405-bb-trace"
-      vorntool logdump bb tar.gz)sh");
-    EXPECT_EQ(r.status, 0) << build;
-    const std::string path = std::string(build) == "build=internal"
-                                 ? kSnapshot + "log-bb-2026-01-02-030405-bb-trace"
-                                 : kScratch;
-    EXPECT_EQ(r.out, "Baseband log collection: Success (Vorn not running)\nPath = " + path + "\n") << build;
-    EXPECT_EQ(r.err, "");
-  }
-
-  // No snapshot and no helper: the scratch folder.
-  r = runInSandbox({"--no-vornd", "--no-helper"}, "vorntool logdump bb");
-  EXPECT_EQ(r.out, "Baseband log collection: Success (Vorn not running)\nPath = " + kScratch + "\n");
 }
 
 TEST_F(VorntoolServerDown, AServerThatStartsLaterIsSeenAtTheNextPrompt) {
@@ -90,9 +68,7 @@ TEST_F(VorntoolServerDown, AServerThatStartsLaterIsSeenAtTheNextPrompt) {
     } | vorntool)sh");
   EXPECT_EQ(r.status, 1);  // end of input ends an interactive session with failure
   EXPECT_EQ(r.err, kServerDown);
-  EXPECT_TRUE(matches(r.out, "\\(/vorntool\\)>> \\(/vorntool\\)>> Telephony log collection: Success\nPath = " +
-                                 kSnapshot + "log-bb-" + kTs + "-\\*\n\\(/vorntool\\)>> "))
-      << r.out;
+  EXPECT_TRUE(matches(r.out, kPromptRe + kPromptRe + collectedRe(kTelRe, "-\\*") + kPromptRe)) << r.out;
 }
 
 /// A script that runs an interactive vorntool in the background, fed one line
@@ -146,11 +122,8 @@ TEST_F(VorntoolServerTrust, IgnoresServerEventsFromOtherSenders) {
     say "logdump bb"
     say "logdump tel")sh");
   EXPECT_EQ(r.err, "");
-  EXPECT_TRUE(matches(r.out, "\\(/vorntool\\)>> Telephony log collection: Success\nPath = " + kSnapshot + "log-bb-" + kTs +
-                                 "\\.tar\\.gz\n\\(/vorntool\\)>> Baseband log collection: Success \\(Vorn running\\)\nPath = " +
-                                 kSnapshot + "log-bb-" + kTs +
-                                 "\\.tar\\.gz\n\\(/vorntool\\)>> Telephony log collection: Success\nPath = " + kSnapshot +
-                                 "log-bb-" + kTs + "\\.tar\\.gz\n\\(/vorntool\\)>> "))
+  EXPECT_TRUE(matches(r.out, kPromptRe + collectedRe(kTelRe, kTarGzRe) + kPromptRe + collectedRe(kBbRe, kTarGzRe) +
+                                 kPromptRe + collectedRe(kTelRe, kTarGzRe) + kPromptRe))
       << r.out;
   EXPECT_EQ(r.status, 1);  // the end of input ends an interactive session with failure
 }
@@ -166,82 +139,11 @@ TEST_F(VorntoolServerTrust, ASilentlyKilledServerIsSeenAsDown) {
     say "logdump bb"
     say "logdump tel")sh");
   EXPECT_EQ(r.err, kServerDown);
-  EXPECT_TRUE(matches(r.out, "\\(/vorntool\\)>> Telephony log collection: Success\nPath = " + kSnapshot + "log-bb-" + kTs +
-                                 "\\.tar\\.gz\n\\(/vorntool\\)>> Baseband log collection: Success \\(Vorn not running\\)\n"
-                                 "Path = " + kScratch + "\n\\(/vorntool\\)>> \\(/vorntool\\)>> "))
+  EXPECT_TRUE(matches(r.out, kPromptRe + collectedRe(kTelRe, kTarGzRe) + kPromptRe +
+                                 "Baseband log collection: Success \\(Vorn not running\\)\nPath = " + kScratch + "\n" +
+                                 kPromptRe + kPromptRe))
       << r.out;
   EXPECT_EQ(r.status, 1);
-}
-
-TEST_F(VorntoolAccess, ARefusalSaysWhenTheBusDeniedAccess) {
-  const std::string denied = "vorntool: the server refused access; run as root or as a member of group \"vorn\"\n";
-  struct Case {
-    std::vector<std::string> options;
-    std::string command;
-    std::string out;
-    std::string err;
-  };
-  const std::vector<Case> cases = {
-      {{}, "logdump tel", "", kServerDown + denied},
-      // No server to be denied: the refusal alone.
-      {{"--no-vornd"}, "logdump tel", "", kServerDown},
-      // Not a refusal: bb fails as on any failed enabled check.
-      {{}, "logdump bb", "Baseband log collection: Failed\n", ""},
-  };
-  for (const auto& c : cases) {
-    // nobody, outside group vorn; the sandbox's folder is root's alone until opened.
-    auto r = runInSandbox(c.options, R"sh(
-      chmod 755 "$VORN_ROOT/.."
-      exec setpriv --reuid=65534 --regid=65534 --clear-groups vorntool )sh" + c.command);
-    EXPECT_EQ(r.status, 1) << c.command;
-    EXPECT_EQ(r.out, c.out) << c.command;
-    EXPECT_EQ(r.err, c.err) << c.command;
-  }
-}
-
-TEST_F(VorntoolStartup, ChecksEndWithStatus255) {
-  struct Case {
-    std::vector<std::string> options;
-    std::string out;
-    int status;
-  };
-  const std::vector<Case> cases = {
-      {{"--device", "radio=0"}, "'vorntool' is not supported on this product.\n", 255},
-      {{"--no-telhub"}, "Telhub process is not running. Please run/load Telhub (or modemd) and try again.\n", 255},
-      {{"--no-telhub", "--device", "product=86"}, "", 0},
-  };
-  for (const auto& c : cases) {
-    auto r = runInSandbox(c.options, "vorntool quit");
-    EXPECT_EQ(r.status, c.status) << c.options.back();
-    EXPECT_EQ(r.out, c.out) << c.options.back();
-    EXPECT_EQ(r.err, "");
-  }
-}
-
-TEST_F(VorntoolFailures, EveryRequestEndsWithALineAndTheRightStatus) {
-  struct Case {
-    std::vector<std::string> vorndArgs;
-    std::string command;
-    std::string out;
-    int status;
-  };
-  const std::vector<Case> cases = {
-      {{"--no-reply", "TraceDumpState"}, "logdump tel", "Telephony log collection: Failed\n", 0},
-      {{"--exit-on", "TraceDumpState"}, "logdump core", "Telephony log collection with Coredump: Failed\n", 0},
-      {{"--no-reply", "GetTraceProperty"}, "logdump bb", "Baseband log collection: Failed\n", 1},
-      {{"--fail", "GetTraceProperty=0xE0200001"}, "logdump bb", "Baseband log collection: Failed\n", 1},
-      {{"--fail", "TraceDumpState=0xE0200003"}, "logdump bb x", "Baseband log collection: Failed\n", 0},
-      {{"--fail", "TraceDumpState=0xE0200002"}, "logdump tel", "Telephony log collection: Failed\n", 0},
-  };
-  for (const auto& c : cases) {
-    std::vector<std::string> options;
-    for (const auto& a : c.vorndArgs) options.insert(options.end(), {"--vornd-arg", a});
-    // The client library's call timeout, shortened for the test.
-    auto r = runInSandbox(options, "VORN_CALL_TIMEOUT_MS=1500 vorntool " + c.command);
-    EXPECT_EQ(r.status, c.status) << c.command << " " << c.vorndArgs.front();
-    EXPECT_EQ(r.out, c.out) << c.command << " " << c.vorndArgs.front();
-    EXPECT_EQ(r.err, "") << c.command;
-  }
 }
 
 TEST_F(VorntoolOslog, ExportsTheSelectionToAFile) {
@@ -256,57 +158,115 @@ TEST_F(VorntoolOslog, ExportsTheSelectionToAFile) {
       << r.out;
 }
 
-/// Runs `command` (a shell command line) once, bounded, and prints "NAME STATUS [ERR]".
-std::string boundedRun(const std::string& name, const std::string& command) {
-  return "err=$(timeout 20 " + command + "); echo \"" + name + " $? [$err]\"\n";
+/// One run of the tool in a sandbox and everything it must print and return.
+struct ToolRun {
+  const char* name;
+  std::vector<std::string> options;  // the sandbox's
+  std::string script;
+  int status;
+  std::string out;
+  std::string err = "";
+};
+
+/// Sandbox options that pass `args` to vornd.
+std::vector<std::string> vornd(const std::vector<std::string>& args) {
+  std::vector<std::string> options;
+  for (const auto& a : args) options.insert(options.end(), {"--vornd-arg", a});
+  return options;
 }
 
-TEST_F(VorntoolLostOutput, AFailedWriteIsReportedAndFailsTheRun) {
-  struct Case {
-    const char* name;
-    std::string command;  // stderr into $(...), then stdout redirected
-    std::string expected;
-  };
-  const std::string full = "write error: No space left on device";
-  const std::string closed = "write error: Bad file descriptor";
-  const std::vector<Case> cases = {
-      {"full", "vorntool logdump tel 2>&1 >/dev/full", "1 [vorntool: " + full + "]"},
-      {"closed", "vorntool logdump tel 2>&1 >&-", "1 [vorntool: " + closed + "]"},
-      {"failing-full", "vorntool bogus 2>&1 >/dev/full", "1 [vorntool: " + full + "]"},
-      {"version-full", "vorntool --version 2>&1 >/dev/full", "1 [vorntool: " + full + "]"},
-      // Nothing to lose: an export prints nothing when it succeeds.
-      {"silent-closed", "vorntool logdump oslog 60 \"$VORN_ROOT/../x.txt\" 2>&1 >&-", "0 []"},
-      // Written in full, as before.
-      {"written", "vorntool logdump bb nocompress 2>&1 >\"$VORN_ROOT/../bb.txt\" && wc -l <\"$VORN_ROOT/../bb.txt\"", "0 [2]"},
-  };
-  std::string script, expected;
-  for (const auto& c : cases) {
-    script += boundedRun(c.name, c.command);
-    expected += std::string(c.name) + " " + c.expected + "\n";
-  }
-  // A refusal at start-up keeps its status.
-  script += "echo radio=0 >\"$VORN_ROOT/etc/vorn/device.conf\"\n" +
-            boundedRun("refused-full", "vorntool logdump tel 2>&1 >/dev/full");
-  expected += "refused-full 255 [vorntool: " + full + "]\n";
-  auto r = runInSandbox({}, script);
-  EXPECT_EQ(r.out, expected) << r.err;
+const std::string kDenied = "vorntool: the server refused access; run as root or as a member of group \"vorn\"\n";
+/// The sandbox's folder is root's alone until opened; nobody is outside group vorn.
+const std::string kAsNobody = "chmod 755 \"$VORN_ROOT/..\"; exec setpriv --reuid=65534 --regid=65534 --clear-groups ";
+const std::string kFull = "vorntool: write error: No space left on device\n";
+const std::string kClosed = "vorntool: write error: Bad file descriptor\n";
+const std::string kNotSupported = "'vorntool' is not supported on this product.\n";
+const std::string kOldSnapshot = kSnapshot + "log-bb-2026-01-02-030405-bb-trace";
+const std::string kMakeOldSnapshot = "mkdir -p \"$VORN_ROOT" + kOldSnapshot + "\"; ";
+const std::string kMakeConfAFifo = "conf=\"$VORN_ROOT/etc/vorn/device.conf\"; rm \"$conf\"; mkfifo \"$conf\"; ";
+const std::string kBbServerDown = "Baseband log collection: Success (Vorn not running)\nPath = ";
+/// vorntool with the client library's call timeout shortened for the test.
+const std::string kQuickTool = "VORN_CALL_TIMEOUT_MS=1500 vorntool ";
+
+// Each case: the sandbox's options and the script, then the status and what
+// must come out on standard output and standard error.
+const ToolRun kRuns[] = {
+    {"ServerDownRefusesTel", {"--no-vornd"}, "vorntool logdump tel crash",
+     1, "", kServerDown},
+    {"ServerDownInternalBbFindsTheSnapshot", {"--no-vornd", "--device", "build=internal"},
+     kMakeOldSnapshot + "vorntool logdump bb tar.gz",
+     0, kBbServerDown + kOldSnapshot + "\n"},
+    {"ServerDownCustomerBbGetsTheScratchFolder", {"--no-vornd", "--device", "build=customer"},
+     kMakeOldSnapshot + "vorntool logdump bb tar.gz",
+     0, kBbServerDown + kScratch + "\n"},
+    {"ServerDownBbWithoutSnapshotOrHelper", {"--no-vornd", "--no-helper"}, "vorntool logdump bb",
+     0, kBbServerDown + kScratch + "\n"},
+
+    {"AccessDeniedByTheBus", {}, kAsNobody + "vorntool logdump tel",
+     1, "", kServerDown + kDenied},
+    // No server to be denied: the refusal alone.
+    {"AccessWithNoServer", {"--no-vornd"}, kAsNobody + "vorntool logdump tel",
+     1, "", kServerDown},
+    // Not a refusal: bb fails as on any failed enabled check.
+    {"AccessDeniedToBb", {}, kAsNobody + "vorntool logdump bb",
+     1, "Baseband log collection: Failed\n"},
+
+    {"StartupNoRadio", {"--device", "radio=0"}, "vorntool quit",
+     255, kNotSupported},
+    {"StartupNoTelhub", {"--no-telhub"}, "vorntool quit",
+     255, "Telhub process is not running. Please run/load Telhub (or modemd) and try again.\n"},
+    {"StartupNoTelhubNeededOnProduct86", {"--no-telhub", "--device", "product=86"}, "vorntool quit",
+     0, ""},
+
+    {"TelWithNoReply", vornd({"--no-reply", "TraceDumpState"}), kQuickTool + "logdump tel",
+     0, "Telephony log collection: Failed\n"},
+    {"CoreWithTheServerGone", vornd({"--exit-on", "TraceDumpState"}), kQuickTool + "logdump core",
+     0, "Telephony log collection with Coredump: Failed\n"},
+    {"BbWithNoReplyToTheEnabledCheck", vornd({"--no-reply", "GetTraceProperty"}), kQuickTool + "logdump bb",
+     1, "Baseband log collection: Failed\n"},
+    {"BbWithTheEnabledCheckFailing", vornd({"--fail", "GetTraceProperty=0xE0200001"}), kQuickTool + "logdump bb",
+     1, "Baseband log collection: Failed\n"},
+    {"BbWithTheCollectionFailing", vornd({"--fail", "TraceDumpState=0xE0200003"}), kQuickTool + "logdump bb x",
+     0, "Baseband log collection: Failed\n"},
+    {"TelWithTheCollectionFailing", vornd({"--fail", "TraceDumpState=0xE0200002"}), kQuickTool + "logdump tel",
+     0, "Telephony log collection: Failed\n"},
+
+    // Output that cannot be written is reported and fails the run.
+    {"OutputToAFullDisk", {}, "vorntool logdump tel >/dev/full",
+     1, "", kFull},
+    {"OutputClosed", {}, "vorntool logdump tel >&-",
+     1, "", kClosed},
+    {"FailingCommandToAFullDisk", {}, "vorntool bogus >/dev/full",
+     1, "", kFull},
+    {"VersionToAFullDisk", {}, "vorntool --version >/dev/full",
+     1, "", kFull},
+    // A refusal at start-up keeps its status.
+    {"RefusalToAFullDisk", {"--device", "radio=0"}, "vorntool logdump tel >/dev/full",
+     255, "", kFull},
+    // Nothing to lose: an export prints nothing when it succeeds.
+    {"SilentExportWithOutputClosed", {}, "vorntool logdump oslog 60 \"$VORN_ROOT/../x.txt\" >&-",
+     0, ""},
+
+    // A FIFO that nobody opens from the other end must not hold the tool up.
+    {"ExportIntoAFifoFailsAtOnce", {}, "cd \"$VORN_ROOT/..\"; mkfifo x.fifo; timeout 20 vorntool logdump oslog 60 x.fifo",
+     1, ""},
+    {"DeviceConfMissing", {}, "rm \"$VORN_ROOT/etc/vorn/device.conf\"; vorntool quit",
+     255, kNotSupported},
+    {"DeviceConfAFifoReadsAsMissing", {}, kMakeConfAFifo + "timeout 20 vorntool quit",
+     255, kNotSupported},
+};
+
+class VorntoolRuns : public InTheSandbox, public testing::WithParamInterface<ToolRun> {};
+
+TEST_P(VorntoolRuns, PrintAndReturnExactly) {
+  const ToolRun& run = GetParam();
+  auto r = runInSandbox(run.options, run.script);
+  EXPECT_EQ(r.status, run.status);
+  EXPECT_EQ(r.out, run.out);
+  EXPECT_EQ(r.err, run.err);
 }
 
-// A FIFO that nobody opens from the other end must not hold the tool up: an
-// export into one fails at once, and a device.conf that is one reads as
-// missing.
-TEST_F(VorntoolFifos, NeitherAnExportNorStartUpWaitsForAReader) {
-  auto r = runInSandbox({}, "cd \"$VORN_ROOT/..\"; mkfifo export.fifo\n" +
-                                boundedRun("export", "vorntool logdump oslog 60 export.fifo 2>&1") +
-                                "conf=\"$VORN_ROOT/etc/vorn/device.conf\"; rm \"$conf\"\n" +
-                                boundedRun("missing-conf", "vorntool quit 2>&1") + "mkfifo \"$conf\"\n" +
-                                boundedRun("fifo-conf", "vorntool quit 2>&1"));
-  std::istringstream lines(r.out);
-  std::string exportLine, missingConf, fifoConf;
-  std::getline(lines, exportLine), std::getline(lines, missingConf), std::getline(lines, fifoConf);
-  EXPECT_EQ(exportLine, "export 1 []");
-  ASSERT_TRUE(missingConf.starts_with("missing-conf ")) << r.out << r.err;
-  EXPECT_EQ(fifoConf, "fifo-conf " + missingConf.substr(13));
-}
+INSTANTIATE_TEST_SUITE_P(Sandbox, VorntoolRuns, testing::ValuesIn(kRuns),
+                         [](const auto& paramInfo) { return std::string(paramInfo.param.name); });
 
 }  // namespace
