@@ -26,21 +26,18 @@ std::string quoted(const std::string& word) {
   return q + "'";
 }
 
-SandboxResult runInSandbox(const std::vector<std::string>& sandboxOptions, const std::string& script,
-                           const std::string& input) {
+SandboxResult runInSandbox(const std::vector<std::string>& sandboxOptions, const std::string& script) {
   namespace fs = std::filesystem;
   char pattern[] = "/tmp/vorn-e2e.XXXXXX";
   const fs::path dir = mkdtemp(pattern);
   std::ofstream(dir / "script.sh") << script;
-  std::ofstream(dir / "input") << input;
 
   std::string command = quoted(VORN_SOURCE_DIR "/scripts/vorn-sandbox") + " --build " +
                         quoted(VORN_BUILD_DIR);
   for (const auto& option : sandboxOptions) command += " " + quoted(option);
   command += " -- bash " + quoted(dir / "script.sh");
   // A hung tool must fail the test, not the whole run.
-  command = "timeout -k 5 120 " + command + " <" + quoted(dir / "input") + " >" +
-            quoted(dir / "out") + " 2>" + quoted(dir / "err");
+  command = "timeout -k 5 120 " + command + " </dev/null >" + quoted(dir / "out") + " 2>" + quoted(dir / "err");
 
   SandboxResult result;
   const int raw = std::system(command.c_str());

@@ -24,8 +24,7 @@ struct SandboxResult {
   std::string err;
 };
 
-SandboxResult runInSandbox(const std::vector<std::string>& sandboxOptions, const std::string& script,
-                           const std::string& input = {});
+SandboxResult runInSandbox(const std::vector<std::string>& sandboxOptions, const std::string& script);
 
 /// `word` quoted for a shell command line.
 std::string quoted(const std::string& word);

@@ -23,19 +23,24 @@ const std::string kHelpThenPrompt = "quit\r\n\r\n" + kPrompt;
 
 /// A shell command that plays `steps` against `command` (vorntool and its
 /// arguments) on a pseudo-terminal: a known terminal type, colour not
-/// switched off, no user's editrc, and the history under $VORN_ROOT/../state
-/// unless `env` says otherwise.
+/// switched off, no user's editrc, and the history under ./state unless
+/// `env` says otherwise.
 std::string onTerminal(const Steps& steps, const std::string& env = "", const std::string& driverOptions = "",
                        const std::string& command = "vorntool") {
-  std::string line = "env -u NO_COLOR -u EDITRC TERM=xterm HOME=\"$VORN_ROOT/..\" "
-                     "XDG_STATE_HOME=\"$VORN_ROOT/../state\" " + env + " python3 " +
-                     quoted(VORN_SOURCE_DIR "/tests/e2e/pty_session.py") + " " + driverOptions;
+  std::string line = "env -u NO_COLOR -u EDITRC TERM=xterm HOME=\"$PWD\" XDG_STATE_HOME=\"$PWD/state\" " + env +
+                     " python3 " + quoted(VORN_SOURCE_DIR "/tests/e2e/pty_session.py") + " " + driverOptions;
   for (const auto& step : steps) line += " " + quoted(step);
   return line + " -- " + command;
 }
 
+/// Runs `script` in a sandbox, in the folder above the platform root, where
+/// the sessions keep their history and leave their files.
+SandboxResult runBesideTheRoot(const std::vector<std::string>& sandboxOptions, const std::string& script) {
+  return runInSandbox(sandboxOptions, "cd \"$VORN_ROOT/..\"\n" + script);
+}
+
 TEST_F(VorntoolTerminal, TabCompletesFromTheCommandTree) {
-  auto r = runInSandbox({}, onTerminal({
+  auto r = runBesideTheRoot({}, onTerminal({
       expect(kPrompt),
       send("log\t"), expect("dump "),
       // A second Tab has nothing to add: it lists what may follow.
@@ -61,31 +66,27 @@ TEST_F(VorntoolTerminal, UpArrowRecallsLinesAlsoAfterARestart) {
       send("\r"), expect(rootHelpThenPrompt),
       send("quit\r"),
   });
-  auto r = runInSandbox({}, first + " >/dev/null; echo \"first $?\"\n"
-                        "state=\"$VORN_ROOT/../state/vorntool\"\n"
-                        "stat -c '%a %n' \"$state\" \"$state/history\" | sed \"s|$state|STATE|\"\n"
-                        "tail -n +2 \"$state/history\"\n" +
-                        second + " >/dev/null; echo \"second $?\"");
-  EXPECT_EQ(r.out, "first 0\n700 STATE\n600 STATE/history\nhelp\nquit\nsecond 0\n") << r.err;
+  auto r = runBesideTheRoot({}, first + " >/dev/null; echo \"first $?\"\n"
+                            "stat -c '%a %n' state/vorntool state/vorntool/history\n"
+                            "tail -n +2 state/vorntool/history\n" +
+                            second + " >/dev/null; echo \"second $?\"");
+  EXPECT_EQ(r.out, "first 0\n700 state/vorntool\n600 state/vorntool/history\nhelp\nquit\nsecond 0\n") << r.err;
 }
 
 TEST_F(VorntoolTerminal, AnEmptyHistfileKeepsNoHistoryAndAPathIsUsedAsGiven) {
   // Ctrl-D at an empty prompt is the end of input: status 1, as from a pipe.
   const Steps steps{expect(kPrompt), send("help\r"), expect(kHelpThenPrompt), send("\x04")};
-  auto r = runInSandbox({}, onTerminal(steps, "VORNTOOL_HISTFILE=") + " >/dev/null; echo \"off $?\"\n"
-                        "[ -e \"$VORN_ROOT/../state\" ] && echo 'state written' || echo 'no state'\n" +
-                        onTerminal(steps, "VORNTOOL_HISTFILE=\"$VORN_ROOT/../custom\"") +
-                        " >/dev/null; echo \"custom $?\"\n"
-                        "cat \"$VORN_ROOT/../custom\"; ls \"$VORN_ROOT/..\" | grep -c custom");
+  auto r = runBesideTheRoot({}, onTerminal(steps, "VORNTOOL_HISTFILE=") + " >/dev/null; echo \"off $?\"\n"
+                            "[ -e state ] && echo 'state written' || echo 'no state'\n" +
+                            onTerminal(steps, "VORNTOOL_HISTFILE=custom") + " >/dev/null; echo \"custom $?\"\n"
+                            "cat custom; ls | grep -c custom");
   EXPECT_EQ(r.out, "off 1\nno state\ncustom 1\n_HiStOrY_V2_\nhelp\n1\n") << r.err;
 }
 
 TEST_F(VorntoolTerminal, WithOutputPipedThePromptStaysOnTheTerminal) {
-  auto r = runInSandbox({}, onTerminal({expect(kPrompt), send("help\r"), expect(kPrompt), send("quit\r")},
-                                       "", "--stdout \"$VORN_ROOT/../out\"") +
-                                " >\"$VORN_ROOT/../screen\"; echo \"status $?\"\n"
-                                "cat \"$VORN_ROOT/../out\"\n"
-                                "grep -c 'Options for command' \"$VORN_ROOT/../screen\"");
+  const Steps steps{expect(kPrompt), send("help\r"), expect(kPrompt), send("quit\r")};
+  auto r = runBesideTheRoot({}, onTerminal(steps, "", "--stdout out") + " >screen; echo \"status $?\"\n"
+                            "cat out; grep -c 'Options for command' screen");
   EXPECT_EQ(r.out, "status 0\n"
                    "\nOptions for command '\x1b[32mvorntool\x1b[39m':\n\n"
                    "\t         logdump  -  [bb|core|oslog|tel]\n\n"
@@ -113,30 +114,28 @@ const std::vector<std::string> kSlowServer = {"--vornd-arg", "--reply-delay-ms",
 const std::string kWaiting = "waiting for the server\u2026 [0-9]+ s";
 /// The line shown until the result comes, and cleared just before it.
 std::string clearedBefore(const std::string& result) { return "[0-9] s\r\x1b\\[K" + result; }
-const std::string kScreenOption = "--screen \"$VORN_ROOT/../screen\"";
 /// The final screen, with the collection's timestamp made constant.
-const std::string kShowScreen = "sed 's/log-bb-[-0-9]*/log-bb-TS/' \"$VORN_ROOT/../screen\"\n";
+const std::string kShowScreen = "sed 's/log-bb-[-0-9]*/log-bb-TS/' screen\n";
 const std::string kBasebandResult =
     "Baseband log collection: Success (Vorn running)\n"
     "Path = /var/wireless/Library/Logs/CrashReporter/Baseband/log-bb-TS.tar.gz\n";
 
 TEST_F(VorntoolProgress, ASlowAnswerShowsTheWaitAndTheScreenEndsWithTheResultOnly) {
-  auto r = runInSandbox(kSlowServer, onTerminal({expect(kWaiting), expect(clearedBefore("Baseband log collection"))}, "",
-                                                kScreenOption, "vorntool logdump bb x") +
-                                         " >\"$VORN_ROOT/../raw\"; echo \"status $?\"\n" + kShowScreen +
-                                         "[ $(grep -o 'waiting for the server' \"$VORN_ROOT/../raw\" | wc -l) -gt 1 ] "
-                                         "&& echo redrawn");
+  const Steps steps{expect(kWaiting), expect(clearedBefore("Baseband log collection"))};
+  auto r = runBesideTheRoot(kSlowServer, onTerminal(steps, "", "--screen screen", "vorntool logdump bb x") +
+                                             " >raw; echo \"status $?\"\n" + kShowScreen +
+                                             "[ $(grep -o 'waiting for the server' raw | wc -l) -gt 1 ] && echo redrawn");
   EXPECT_EQ(r.out, "status 0\n" + kBasebandResult + "redrawn\n") << r.err;
 }
 
 TEST_F(VorntoolProgress, TheTelephonyWaitIsGoneBeforeItsCompletionPrints) {
   // The server's state arrives as late as every answer: "bb", which runs
   // without it, gives it time to come before "tel" needs it.
-  auto r = runInSandbox(kSlowServer, onTerminal({
+  auto r = runBesideTheRoot(kSlowServer, onTerminal({
       expect(kPrompt), send("logdump bb x\r"), expect(kWaiting), expect(kPrompt),
       send("logdump tel x\r"), expect(kWaiting), expect(clearedBefore("Telephony log collection: Success")),
       expect(kPrompt), send("quit\r"),
-  }, "", kScreenOption) + " >/dev/null; echo \"status $?\"\n" + kShowScreen);
+  }, "", "--screen screen") + " >/dev/null; echo \"status $?\"\n" + kShowScreen);
   EXPECT_EQ(r.out, "status 0\n(/vorntool)>> logdump bb x\n" + kBasebandResult +
                        "(/vorntool)>> logdump tel x\n"
                        "Telephony log collection: Success\n"
@@ -148,13 +147,12 @@ TEST_F(VorntoolProgress, TheTelephonyWaitIsGoneBeforeItsCompletionPrints) {
 TEST_F(VorntoolProgress, NothingIsDrawnIntoAFileOnADumbTerminalOrOverAPlainPrompt) {
   // What the terminal got, control characters made visible.
   const std::string shown = " | cat -v | sed 's/log-bb-[-0-9]*/log-bb-TS/'\n";
-  auto r = runInSandbox(kSlowServer,
-                        "vorntool logdump bb x >\"$VORN_ROOT/../out\" 2>\"$VORN_ROOT/../err\"; "
-                        "echo \"piped $? $(wc -l <\"$VORN_ROOT/../out\") $(wc -c <\"$VORN_ROOT/../err\")\"\n" +
-                        onTerminal({}, "", "", "sh -c 'exec vorntool logdump bb x 2>\"$VORN_ROOT/../err\"'") +
-                        shown + "echo \"stderr to a file $(wc -c <\"$VORN_ROOT/../err\")\"\n" +
-                        onTerminal({}, "TERM=dumb", "", "vorntool logdump bb x") + shown +
-                        onTerminal({}, "", "", "sh -c 'echo logdump bb x | vorntool'") + shown);
+  auto r = runBesideTheRoot(kSlowServer,
+                            "vorntool logdump bb x >out 2>err; echo \"piped $? $(wc -l <out) $(wc -c <err)\"\n" +
+                                onTerminal({}, "", "", "sh -c 'exec vorntool logdump bb x 2>err'") + shown +
+                                "echo \"stderr to a file $(wc -c <err)\"\n" +
+                                onTerminal({}, "TERM=dumb", "", "vorntool logdump bb x") + shown +
+                                onTerminal({}, "", "", "sh -c 'echo logdump bb x | vorntool'") + shown);
   const std::string onScreen = "Baseband log collection: Success (Vorn running)^M\n"
                                "Path = /var/wireless/Library/Logs/CrashReporter/Baseband/log-bb-TS.tar.gz^M\n";
   EXPECT_EQ(r.out, "piped 0 2 0\n" + onScreen + "stderr to a file 0\n" + onScreen + "(/vorntool)>> " +
