@@ -55,13 +55,6 @@ class Terminal:
         self.seen += chunk
         return bool(chunk)
 
-    def drain(self, deadline):
-        """Reads until the other side is closed; False when the deadline comes first."""
-        while time.monotonic() < deadline:
-            if not self.pump(deadline):
-                return True
-        return False
-
     def editing(self, timeout):
         deadline = time.monotonic() + timeout
         # No event says so: look again whenever output comes, or every 10 ms.
@@ -94,8 +87,10 @@ def play(terminal, steps, timeout):
             os.write(terminal.master, data)
         elif not terminal.expect(data, timeout):
             return "no match for %r after %r" % (data, terminal.seen[terminal.mark:])
-    if not terminal.drain(time.monotonic() + timeout):
-        return "the program did not end"
+    deadline = time.monotonic() + timeout
+    while terminal.pump(deadline):
+        if time.monotonic() >= deadline:
+            return "the program did not end"
     return None
 
 

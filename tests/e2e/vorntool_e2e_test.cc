@@ -180,6 +180,8 @@ const std::string kNotSupported = "'vorntool' is not supported on this product.\
 const std::string kOldSnapshot = kSnapshot + "log-bb-2026-01-02-030405-bb-trace";
 const std::string kMakeOldSnapshot = "mkdir -p \"$VORN_ROOT" + kOldSnapshot + "\"; ";
 const std::string kMakeConfAFifo = "conf=\"$VORN_ROOT/etc/vorn/device.conf\"; rm \"$conf\"; mkfifo \"$conf\"; ";
+const std::string kTelFailed = "Telephony log collection: Failed\n";
+const std::string kBbFailed = "Baseband log collection: Failed\n";
 const std::string kBbServerDown = "Baseband log collection: Success (Vorn not running)\nPath = ";
 /// vorntool with the client library's call timeout shortened for the test.
 const std::string kQuickTool = "VORN_CALL_TIMEOUT_MS=1500 vorntool ";
@@ -187,8 +189,7 @@ const std::string kQuickTool = "VORN_CALL_TIMEOUT_MS=1500 vorntool ";
 // Each case: the sandbox's options and the script, then the status and what
 // must come out on standard output and standard error.
 const ToolRun kRuns[] = {
-    {"ServerDownRefusesTel", {"--no-vornd"}, "vorntool logdump tel crash",
-     1, "", kServerDown},
+    {"ServerDownRefusesTel", {"--no-vornd"}, "vorntool logdump tel crash", 1, "", kServerDown},
     {"ServerDownInternalBbFindsTheSnapshot", {"--no-vornd", "--device", "build=internal"},
      kMakeOldSnapshot + "vorntool logdump bb tar.gz",
      0, kBbServerDown + kOldSnapshot + "\n"},
@@ -198,58 +199,40 @@ const ToolRun kRuns[] = {
     {"ServerDownBbWithoutSnapshotOrHelper", {"--no-vornd", "--no-helper"}, "vorntool logdump bb",
      0, kBbServerDown + kScratch + "\n"},
 
-    {"AccessDeniedByTheBus", {}, kAsNobody + "vorntool logdump tel",
-     1, "", kServerDown + kDenied},
+    {"AccessDeniedByTheBus", {}, kAsNobody + "vorntool logdump tel", 1, "", kServerDown + kDenied},
     // No server to be denied: the refusal alone.
-    {"AccessWithNoServer", {"--no-vornd"}, kAsNobody + "vorntool logdump tel",
-     1, "", kServerDown},
+    {"AccessWithNoServer", {"--no-vornd"}, kAsNobody + "vorntool logdump tel", 1, "", kServerDown},
     // Not a refusal: bb fails as on any failed enabled check.
-    {"AccessDeniedToBb", {}, kAsNobody + "vorntool logdump bb",
-     1, "Baseband log collection: Failed\n"},
+    {"AccessDeniedToBb", {}, kAsNobody + "vorntool logdump bb", 1, kBbFailed},
 
-    {"StartupNoRadio", {"--device", "radio=0"}, "vorntool quit",
-     255, kNotSupported},
+    {"StartupNoRadio", {"--device", "radio=0"}, "vorntool quit", 255, kNotSupported},
     {"StartupNoTelhub", {"--no-telhub"}, "vorntool quit",
      255, "Telhub process is not running. Please run/load Telhub (or modemd) and try again.\n"},
-    {"StartupNoTelhubNeededOnProduct86", {"--no-telhub", "--device", "product=86"}, "vorntool quit",
-     0, ""},
+    {"StartupNoTelhubNeededOnProduct86", {"--no-telhub", "--device", "product=86"}, "vorntool quit", 0, ""},
 
-    {"TelWithNoReply", vornd({"--no-reply", "TraceDumpState"}), kQuickTool + "logdump tel",
-     0, "Telephony log collection: Failed\n"},
-    {"CoreWithTheServerGone", vornd({"--exit-on", "TraceDumpState"}), kQuickTool + "logdump core",
+    {"TelUnanswered", vornd({"--no-reply", "TraceDumpState"}), kQuickTool + "logdump tel", 0, kTelFailed},
+    {"CoreServerGone", vornd({"--exit-on", "TraceDumpState"}), kQuickTool + "logdump core",
      0, "Telephony log collection with Coredump: Failed\n"},
-    {"BbWithNoReplyToTheEnabledCheck", vornd({"--no-reply", "GetTraceProperty"}), kQuickTool + "logdump bb",
-     1, "Baseband log collection: Failed\n"},
-    {"BbWithTheEnabledCheckFailing", vornd({"--fail", "GetTraceProperty=0xE0200001"}), kQuickTool + "logdump bb",
-     1, "Baseband log collection: Failed\n"},
-    {"BbWithTheCollectionFailing", vornd({"--fail", "TraceDumpState=0xE0200003"}), kQuickTool + "logdump bb x",
-     0, "Baseband log collection: Failed\n"},
-    {"TelWithTheCollectionFailing", vornd({"--fail", "TraceDumpState=0xE0200002"}), kQuickTool + "logdump tel",
-     0, "Telephony log collection: Failed\n"},
+    {"BbEnabledCheckUnanswered", vornd({"--no-reply", "GetTraceProperty"}), kQuickTool + "logdump bb", 1, kBbFailed},
+    {"BbEnabledCheckFails", vornd({"--fail", "GetTraceProperty=0xE0200001"}), kQuickTool + "logdump bb", 1, kBbFailed},
+    {"BbCollectionFails", vornd({"--fail", "TraceDumpState=0xE0200003"}), kQuickTool + "logdump bb x", 0, kBbFailed},
+    {"TelCollectionFails", vornd({"--fail", "TraceDumpState=0xE0200002"}), kQuickTool + "logdump tel", 0, kTelFailed},
 
     // Output that cannot be written is reported and fails the run.
-    {"OutputToAFullDisk", {}, "vorntool logdump tel >/dev/full",
-     1, "", kFull},
-    {"OutputClosed", {}, "vorntool logdump tel >&-",
-     1, "", kClosed},
-    {"FailingCommandToAFullDisk", {}, "vorntool bogus >/dev/full",
-     1, "", kFull},
-    {"VersionToAFullDisk", {}, "vorntool --version >/dev/full",
-     1, "", kFull},
+    {"OutputToAFullDisk", {}, "vorntool logdump tel >/dev/full", 1, "", kFull},
+    {"OutputClosed", {}, "vorntool logdump tel >&-", 1, "", kClosed},
+    {"FailingCommandToAFullDisk", {}, "vorntool bogus >/dev/full", 1, "", kFull},
+    {"VersionToAFullDisk", {}, "vorntool --version >/dev/full", 1, "", kFull},
     // A refusal at start-up keeps its status.
-    {"RefusalToAFullDisk", {"--device", "radio=0"}, "vorntool logdump tel >/dev/full",
-     255, "", kFull},
+    {"RefusalToAFullDisk", {"--device", "radio=0"}, "vorntool logdump tel >/dev/full", 255, "", kFull},
     // Nothing to lose: an export prints nothing when it succeeds.
-    {"SilentExportWithOutputClosed", {}, "vorntool logdump oslog 60 \"$VORN_ROOT/../x.txt\" >&-",
-     0, ""},
+    {"SilentExportWithOutputClosed", {}, "vorntool logdump oslog 60 \"$VORN_ROOT/../x.txt\" >&-", 0, ""},
 
     // A FIFO that nobody opens from the other end must not hold the tool up.
     {"ExportIntoAFifoFailsAtOnce", {}, "cd \"$VORN_ROOT/..\"; mkfifo x.fifo; timeout 20 vorntool logdump oslog 60 x.fifo",
      1, ""},
-    {"DeviceConfMissing", {}, "rm \"$VORN_ROOT/etc/vorn/device.conf\"; vorntool quit",
-     255, kNotSupported},
-    {"DeviceConfAFifoReadsAsMissing", {}, kMakeConfAFifo + "timeout 20 vorntool quit",
-     255, kNotSupported},
+    {"DeviceConfMissing", {}, "rm \"$VORN_ROOT/etc/vorn/device.conf\"; vorntool quit", 255, kNotSupported},
+    {"DeviceConfAFifoReadsAsMissing", {}, kMakeConfAFifo + "timeout 20 vorntool quit", 255, kNotSupported},
 };
 
 class VorntoolRuns : public InTheSandbox, public testing::WithParamInterface<ToolRun> {};
