@@ -24,8 +24,7 @@ void CommandBase::addCommandHandler(std::string handlerName, CommandHandler hand
   if (!help.empty()) helpTexts.insert_or_assign(std::move(handlerName), std::move(help));
 }
 
-void CommandBase::addCommandHandler(std::string handlerName, CommandHandler handler,
-                                    std::string help,
+void CommandBase::addCommandHandler(std::string handlerName, CommandHandler handler, std::string help,
                                     OptionWords options) {
   if (!handler) return;
   optionWords.insert_or_assign(handlerName, std::move(options));
